@@ -95,16 +95,41 @@ int main(int argc, char** argv) {
     PrintHelp(std::cerr);
     return kExitUsage;
   }
-  const std::string name = argv[i];
+  // A command's name may have several words ("kb pack", "dump tokens"): the longest
+  // registered name that the next words spell wins.
+  const Command* chosen = nullptr;
+  std::size_t chosenWords = 0;
   for (const Command& command : Commands()) {
-    if (command.name != name) continue;
-    std::vector<std::string> args(argv + i + 1, argv + argc);
+    std::string spelled;
+    for (int w = i; w < argc; ++w) {
+      if (w > i) spelled += ' ';
+      spelled += argv[w];
+      if (spelled == command.name && static_cast<std::size_t>(w - i + 1) > chosenWords) {
+        chosen = &command;
+        chosenWords = static_cast<std::size_t>(w - i + 1);
+      }
+      if (spelled.size() >= command.name.size()) break;
+    }
+  }
+  const std::string name = argv[i];
+  if (chosen != nullptr) {
+    std::vector<std::string> args(argv + i + static_cast<int>(chosenWords), argv + argc);
     try {
-      return command.run(args, options);
+      return chosen->run(args, options);
     } catch (const std::exception& e) {
-      std::cerr << "pelmix " << name << ": " << e.what() << "\n";
+      std::cerr << "pelmix " << chosen->name << ": " << e.what() << "\n";
       return kExitFailure;
     }
   }
+  // A group word alone ("pelmix kb") lists the group's commands.
+  bool group = false;
+  for (const Command& command : Commands()) {
+    if (command.name.rfind(name + " ", 0) == 0) {
+      if (!group) std::cerr << "pelmix " << name << ": a subcommand is needed:\n";
+      group = true;
+      std::cerr << "  pelmix " << command.name << " " << command.usage << "\n";
+    }
+  }
+  if (group) return kExitUsage;
   return UsageError("unknown command " + name);
 }
