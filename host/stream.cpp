@@ -87,8 +87,8 @@ uvo::Ptr<FileStream> FileStream::Open(const std::string& path, std::string* erro
   if (fd < 0 || ::fstat(fd, &info) != 0 || !S_ISREG(info.st_mode)) {
     const int code = fd < 0 || errno != 0 ? errno : EINVAL;
     if (error != nullptr) {
-      *error = path + ": " + (fd >= 0 && S_ISDIR(info.st_mode) ? "is a directory"
-                                                               : std::strerror(code));
+      *error =
+          path + ": " + (fd >= 0 && S_ISDIR(info.st_mode) ? "is a directory" : std::strerror(code));
     }
     if (fd >= 0) ::close(fd);
     return nullptr;
@@ -121,8 +121,7 @@ uvo::result_t FileStream::Write(const void*, std::uint32_t, std::uint32_t* writt
   return uvo::kErrAccessDenied;
 }
 
-uvo::result_t FileStream::Seek(std::uint32_t origin, std::int64_t offset,
-                               std::uint64_t* position) {
+uvo::result_t FileStream::Seek(std::uint32_t origin, std::int64_t offset, std::uint64_t* position) {
   std::uint64_t target;
   if (!ResolveSeek(origin, offset, position_, size_, &target)) return uvo::kErrInvalidArgument;
   position_ = target;

@@ -22,7 +22,7 @@ uvo::result_t Tracer::CreateRecord(int level, char** buffer, std::uint32_t size)
     char* key = grown.data.get();
     open_.emplace(key, std::move(grown));
     *buffer = key;
-    ++regrows_;
+    regrows_.push_back(size);
     return uvo::kOk;
   }
   if (refuseRecords_ || level > level_) return uvo::kFalse;
@@ -93,6 +93,11 @@ std::vector<std::string> Tracer::Texts() const {
 void Tracer::Clear() {
   std::lock_guard<std::mutex> lock(mutex_);
   lines_.clear();
+}
+
+std::vector<std::uint32_t> Tracer::RegrowSizes() const {
+  std::lock_guard<std::mutex> lock(mutex_);
+  return regrows_;
 }
 
 std::size_t Tracer::OpenRecords() const {

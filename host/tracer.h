@@ -49,7 +49,8 @@ class Tracer final : public uvo::ObjectImpl<Tracer, uvo::ITracer, uvo::ITraceLev
   void Clear();
   int Level() const { return level_; }
   std::size_t OpenRecords() const;
-  std::size_t RegrowCount() const { return regrows_; }
+  // Sizes asked for by each regrow (level 1000), in order.
+  std::vector<std::uint32_t> RegrowSizes() const;
 
  private:
   mutable std::mutex mutex_;
@@ -65,7 +66,7 @@ class Tracer final : public uvo::ObjectImpl<Tracer, uvo::ITracer, uvo::ITraceLev
   };
   std::map<char*, Record> open_;
   std::vector<TraceLine> lines_;
-  std::size_t regrows_ = 0;
+  std::vector<std::uint32_t> regrows_;
 };
 
 }  // namespace pelmix::host

@@ -46,8 +46,7 @@ class TraceRecord {
 }  // namespace ap
 
 // AP_TRACE(ap::kSeverityMessage) << "text" << value;  composes nothing when disabled.
-#define AP_TRACE(severity)                                          \
-  if (::ap::TraceRecord ap_trace_record_{severity};                 \
-      !ap_trace_record_.Enabled()) {                                \
-  } else                                                            \
+#define AP_TRACE(severity)                                                         \
+  if (::ap::TraceRecord ap_trace_record_{severity}; !ap_trace_record_.Enabled()) { \
+  } else                                                                           \
     ap_trace_record_.Stream()

@@ -5,8 +5,8 @@
 
 namespace uvo {
 
-Exception::Exception(const char* file, int line, const char* function,
-                     std::u16string description, IObject* nested)
+Exception::Exception(const char* file, int line, const char* function, std::u16string description,
+                     IObject* nested)
     : file_(file ? file : ""),
       line_(line),
       function_(function ? function : ""),
@@ -45,7 +45,6 @@ std::u16string ResultCodeException::Description() const {
 
 GetInterfaceException::GetInterfaceException(const char* file, int line, const char* function,
                                              iid_t iid, result_t code)
-    : ResultCodeException(file, line, function, code, u"iid = " + Widen(HexCode(iid))),
-      iid_(iid) {}
+    : ResultCodeException(file, line, function, code, u"iid = " + Widen(HexCode(iid))), iid_(iid) {}
 
 }  // namespace uvo

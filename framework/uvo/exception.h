@@ -56,8 +56,7 @@ class SystemException : public ResultCodeException {
 
 class GetInterfaceException : public ResultCodeException {
  public:
-  GetInterfaceException(const char* file, int line, const char* function, iid_t iid,
-                        result_t code);
+  GetInterfaceException(const char* file, int line, const char* function, iid_t iid, result_t code);
   const char* what() const noexcept override { return "GetInterfaceException"; }
   iid_t Iid() const { return iid_; }
 
@@ -96,17 +95,17 @@ constexpr const char* SourceBaseName(const char* path) {
 }  // namespace uvo
 
 // A failed precondition.
-#define UVO_CHECK(condition)                                                          \
-  do {                                                                                \
-    if (!(condition)) throw ::uvo::CheckFailedException(::uvo::SourceBaseName(__FILE__), \
-                                                        __LINE__);                    \
+#define UVO_CHECK(condition)                                                        \
+  do {                                                                              \
+    if (!(condition))                                                               \
+      throw ::uvo::CheckFailedException(::uvo::SourceBaseName(__FILE__), __LINE__); \
   } while (0)
 
 // A host call whose result code must not be a failure.
-#define UVO_CHECK_RESULT(expression)                                                       \
-  do {                                                                                     \
-    const ::uvo::result_t uvo_check_result_ = (expression);                                \
-    if (uvo_check_result_ < 0)                                                             \
-      throw ::uvo::CheckResultFailedException(::uvo::SourceBaseName(__FILE__), __LINE__,  \
-                                              uvo_check_result_);                          \
+#define UVO_CHECK_RESULT(expression)                                                     \
+  do {                                                                                   \
+    const ::uvo::result_t uvo_check_result_ = (expression);                              \
+    if (uvo_check_result_ < 0)                                                           \
+      throw ::uvo::CheckResultFailedException(::uvo::SourceBaseName(__FILE__), __LINE__, \
+                                              uvo_check_result_);                        \
   } while (0)

@@ -46,9 +46,10 @@ class IServiceLocator : public IObject {
 class IAllocator : public IObject {
  public:
   static constexpr iid_t kIid = 0x9CCA5603;
-  virtual void* Allocate(std::uint32_t size) = 0;                     // slot 3; null on failure
-  virtual void* Reallocate(void* pointer, std::uint32_t size) = 0;    // slot 4; not used by the module
-  virtual void Free(void* pointer) = 0;                               // slot 5
+  virtual void* Allocate(std::uint32_t size) = 0;  // slot 3; null on failure
+  virtual void* Reallocate(void* pointer,
+                           std::uint32_t size) = 0;  // slot 4; not used by the module
+  virtual void Free(void* pointer) = 0;              // slot 5
 
  protected:
   ~IAllocator() = default;
@@ -91,9 +92,9 @@ class IStream : public IObject {
   virtual result_t Write(const void* buffer, std::uint32_t count,
                          std::uint32_t* written) = 0;  // slot 4, not used by the module
   virtual result_t Seek(std::uint32_t origin, std::int64_t offset,
-                        std::uint64_t* position) = 0;      // slot 5
-  virtual result_t Tell(std::uint64_t* position) = 0;      // slot 6
-  virtual result_t GetSize(std::uint64_t* size) = 0;       // slot 7
+                        std::uint64_t* position) = 0;  // slot 5
+  virtual result_t Tell(std::uint64_t* position) = 0;  // slot 6
+  virtual result_t GetSize(std::uint64_t* size) = 0;   // slot 7
 
  protected:
   ~IStream() = default;

@@ -10,7 +10,7 @@
 namespace pelmix::cli {
 
 struct GlobalOptions {
-  std::string modulePath;        // --module PATH
+  std::string modulePath;         // --module PATH
   std::optional<int> traceLevel;  // --trace LEVEL
 };
 
@@ -38,8 +38,8 @@ int UsageError(const std::string& message);
 
 #define PELMIX_CLI_CONCAT_INNER(a, b) a##b
 #define PELMIX_CLI_CONCAT(a, b) PELMIX_CLI_CONCAT_INNER(a, b)
-#define PELMIX_COMMAND(...)                                               \
-  namespace {                                                             \
+#define PELMIX_COMMAND(...)                                              \
+  namespace {                                                            \
   [[maybe_unused]] const bool PELMIX_CLI_CONCAT(registered_, __LINE__) = \
-      ::pelmix::cli::RegisterCommand(__VA_ARGS__);                        \
+      ::pelmix::cli::RegisterCommand(__VA_ARGS__);                       \
   }

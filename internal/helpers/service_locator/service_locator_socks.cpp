@@ -8,8 +8,8 @@
 namespace cf {
 
 template <class Interface>
-uvo::Ptr<uvo::IServiceLocator> ServiceLocatorSocks<Interface>::Create(
-    uvo::IServiceLocator* locator, Interface* replacement) {
+uvo::Ptr<uvo::IServiceLocator> ServiceLocatorSocks<Interface>::Create(uvo::IServiceLocator* locator,
+                                                                      Interface* replacement) {
   if (locator == nullptr) {
     throw helpers::LogicError("ServiceLocatorSocks::Create(): service locator requiered",
                               uvo::kErrInvalidArgument);

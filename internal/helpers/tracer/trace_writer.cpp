@@ -22,12 +22,10 @@ TraceWriter::~TraceWriter() { Commit(); }
 
 bool TraceWriter::Grow(std::uint32_t needed) {
   const std::uint64_t doubled = std::uint64_t{capacity_} * 2;
-  const std::uint32_t size = static_cast<std::uint32_t>(
-      std::min<std::uint64_t>(std::max<std::uint64_t>(needed, doubled),
-                              std::numeric_limits<std::uint32_t>::max()));
+  const std::uint32_t size = static_cast<std::uint32_t>(std::min<std::uint64_t>(
+      std::max<std::uint64_t>(needed, doubled), std::numeric_limits<std::uint32_t>::max()));
   char* buffer = buffer_;
-  if (tracer_->CreateRecord(uvo::ITracer::kRegrowLevel, &buffer, size) != 0 ||
-      buffer == nullptr) {
+  if (tracer_->CreateRecord(uvo::ITracer::kRegrowLevel, &buffer, size) != 0 || buffer == nullptr) {
     // The tracer could not regrow the record: the text is dropped.
     buffer_ = nullptr;
     length_ = capacity_ = 0;

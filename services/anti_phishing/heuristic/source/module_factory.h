@@ -14,8 +14,7 @@ class ModuleFactory final : public uvo::ObjectImpl<ModuleFactory, uvo::IObjectFa
  public:
   ModuleFactory() = default;
   ~ModuleFactory() = default;
-  uvo::result_t CreateInstance(uvo::IServiceLocator* locator, uvo::iid_t iid,
-                               void** out) override;
+  uvo::result_t CreateInstance(uvo::IServiceLocator* locator, uvo::iid_t iid, void** out) override;
 
  private:
   uvo::detail::ObjectModuleAutoLock moduleLock_;

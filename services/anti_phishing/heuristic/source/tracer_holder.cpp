@@ -30,8 +30,7 @@ std::shared_ptr<TracerHolder> TracerHolder::Acquire(uvo::ITracer* tracer) {
   return holder;
 }
 
-TracerHolder::TracerHolder(uvo::ITracer* tracer)
-    : tracer_(uvo::Ptr<uvo::ITracer>::Share(tracer)) {}
+TracerHolder::TracerHolder(uvo::ITracer* tracer) : tracer_(uvo::Ptr<uvo::ITracer>::Share(tracer)) {}
 
 TracerHolder::~TracerHolder() {
   platform::CriticalSectionLock lock(HolderLock());
