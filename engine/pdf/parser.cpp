@@ -233,6 +233,7 @@ void Parser::SubURI::finish(Parser& parser) {
 void Parser::SubStream::feed(char c, Parser& parser) {
   if (c == kEndstream[endstreamMatched_]) {
     if (++endstreamMatched_ == kEndstream.size()) {
+      endstreamMatched_ = 0;
       parser.current_ = &parser.subNull_;
       finish(parser);
     }
@@ -248,6 +249,9 @@ void Parser::SubStream::feed(char c, Parser& parser) {
 }
 
 void Parser::SubStream::finish(Parser& parser) {
+  // A stream ended by "endobj" or by the end of data keeps the bytes that only looked like
+  // the start of "endstream".
+  for (std::size_t i = 0; i < endstreamMatched_; ++i) parser.handler_.streamByte(kEndstream[i]);
   endstreamMatched_ = 0;
   parser.handler_.streamEnd();
 }
