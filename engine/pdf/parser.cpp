@@ -1,5 +1,7 @@
 #include "engine/pdf/parser.h"
 
+#include <cstring>
+
 namespace pdf {
 namespace {
 
@@ -11,7 +13,18 @@ bool IsDigit(unsigned char c) { return c >= '0' && c <= '9'; }
 }  // namespace
 
 void Parser::feed(const char* data, std::size_t size) {
-  for (std::size_t i = 0; i < size; ++i) FeedByte(static_cast<unsigned char>(data[i]));
+  std::size_t i = 0;
+  while (i < size) {
+    // Inside stream data with no keyword half-matched, every byte up to the next "e" (the
+    // first byte of both "endobj" and "endstream") is plain data: hand it on directly.
+    if (current_ == &subStream_ && endobjMatched_ == 0 && !subStream_.matching()) {
+      const void* e = std::memchr(data + i, 'e', size - i);
+      const std::size_t stop = e == nullptr ? size : static_cast<const char*>(e) - data;
+      for (; i < stop; ++i) handler_.streamByte(data[i]);
+      if (i == size) return;
+    }
+    FeedByte(static_cast<unsigned char>(data[i++]));
+  }
 }
 
 void Parser::finish() {

@@ -1,6 +1,7 @@
 // A shallow, byte-at-a-time push parser of PDF files. It finds indirect objects by their
 // "N G obj" headers and "endobj", scans their dictionaries for /Subtype /Image and /URI
-// strings, and hands the raw bytes of "stream\r\n" ... "endstream" to its handler. It builds
+// strings, and hands the raw bytes between "stream" with its line end and "endstream" to its
+// handler. It builds
 // no object model, never reads the cross-reference table and never decodes anything: a
 // damaged or hostile file can only make it miss things. Every buffer it keeps is bounded.
 #pragma once
@@ -100,19 +101,24 @@ class Parser {
   class SubStream final : public Subparser {
    public:
     void feed(char c, Parser& parser) override;
-    void finish(Parser& parser) override;  // reports the stream's end
+    void finish(Parser& parser) override;                     // reports the stream's end
+    bool matching() const { return endstreamMatched_ != 0; }  // "endstream" half-matched
 
    private:
     std::size_t endstreamMatched_ = 0;
   };
 
-  // The texts the dictionary scanner watches for, and what a match does.
+  // The texts the dictionary scanner watches for, and what a match does. kOptional is the
+  // index of a byte the text may go without (npos: none).
   struct MetaStream {
+    // The keyword's line end is CR LF or a bare LF, as PDF writers use both.
     static constexpr std::string_view kText = "stream\r\n";
+    static constexpr std::size_t kOptional = 6;
     static void Matched(Parser& parser);
   };
   struct MetaURI {
     static constexpr std::string_view kText = "/URI";
+    static constexpr std::size_t kOptional = std::string_view::npos;
     static void Matched(Parser& parser);
   };
 
@@ -122,12 +128,16 @@ class Parser {
    public:
     void feed(char c, Parser& parser) override {
       if (c == Meta::kText[matched_]) {
-        if (++matched_ == Meta::kText.size()) {
-          matched_ = 0;  // the byte after a match may begin the next one
-          Meta::Matched(parser);
-        }
+        ++matched_;
+      } else if (matched_ == Meta::kOptional && c == Meta::kText[matched_ + 1]) {
+        matched_ += 2;
       } else {
         matched_ = c == Meta::kText[0] ? 1 : 0;
+        return;
+      }
+      if (matched_ == Meta::kText.size()) {
+        matched_ = 0;  // the byte after a match may begin the next one
+        Meta::Matched(parser);
       }
     }
     void finish(Parser&) override { matched_ = 0; }

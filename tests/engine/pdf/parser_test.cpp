@@ -29,10 +29,11 @@ TEST(PdfParser, ImageStreamObject) {
   EXPECT_THAT(Parse("12 0 obj\r\n<< /Subtype /Image /Length 5 >>\r\nstream\r\nABCDE\r\n"
                     "endstream\r\nendobj"),
               ElementsAre("obj 12 0", "stream image", "data:ABCDE\r\n", "endstream", "endobj"));
-  // Only "stream" with CR LF opens a stream.
-  EXPECT_THAT(
-      Parse("12 0 obj\r\n<< /Subtype /Image /Length 5 >>\nstream\nABCDE\nendstream\nendobj"),
-      ElementsAre("obj 12 0", "endobj"));
+  // "stream" ends its line with CR LF or LF, never with CR alone or anything else.
+  EXPECT_THAT(Parse("12 0 obj\n<< /Length 5 >>\nstream\nAB\rE\nendstream\nendobj"),
+              ElementsAre("obj 12 0", "stream", "data:AB\rE\n", "endstream", "endobj"));
+  EXPECT_THAT(Parse("1 0 obj <<>>stream\rAB\nendstream endobj 2 0 obj <<>>stream ABC endobj"),
+              ElementsAre("obj 1 0", "endobj", "obj 2 0", "endobj"));
 }
 
 TEST(PdfParser, ImageFlagNeedsExactNamePair) {
