@@ -32,7 +32,9 @@ class FileSystemI {
  public:
   // An empty pointer when there is no such file.
   virtual std::shared_ptr<ReadableFileI> open(const std::string& name) = 0;
-  virtual void enumerate(const std::function<void(const std::string& name)>& callback) = 0;
+  // Calls callback(name, size) once for every file, in the file system's own order.
+  virtual void enumerate(
+      const std::function<void(const std::string& name, std::uint64_t size)>& callback) = 0;
   virtual ~FileSystemI() = default;
 };
 
