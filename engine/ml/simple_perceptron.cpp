@@ -96,7 +96,29 @@ void SimplePerceptron::calc(const std::vector<float>& input, std::vector<float>&
     out.resize(layer.neurons);
     const float* unit = weights_.data() + layer.weights;
     const std::uint32_t inputs = layer.stride - 1;
-    for (std::uint32_t j = 0; j < layer.neurons; ++j, unit += layer.stride) {
+    const std::size_t stride = layer.stride;
+    std::uint32_t j = 0;
+    // Four units at a time: each sum still adds its terms in input order, but the four
+    // chains of dependent additions overlap.
+    for (; j + 4 <= layer.neurons; j += 4, unit += 4 * stride) {
+      const float* w0 = unit;
+      const float* w1 = unit + stride;
+      const float* w2 = unit + 2 * stride;
+      const float* w3 = unit + 3 * stride;
+      float s0 = w0[0], s1 = w1[0], s2 = w2[0], s3 = w3[0];
+      for (std::uint32_t k = 0; k < inputs; ++k) {
+        const float xk = x[k];
+        s0 += xk * w0[k + 1];
+        s1 += xk * w1[k + 1];
+        s2 += xk * w2[k + 1];
+        s3 += xk * w3[k + 1];
+      }
+      out[j] = Sigmoid(s0);
+      out[j + 1] = Sigmoid(s1);
+      out[j + 2] = Sigmoid(s2);
+      out[j + 3] = Sigmoid(s3);
+    }
+    for (; j < layer.neurons; ++j, unit += stride) {
       float sum = unit[0];
       for (std::uint32_t k = 0; k < inputs; ++k) sum += x[k] * unit[k + 1];
       out[j] = Sigmoid(sum);

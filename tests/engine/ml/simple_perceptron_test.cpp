@@ -145,6 +145,26 @@ TEST(SimplePerceptron, TwoLayersExactly) {
   EXPECT_EQ(Forward(network, {x0, x1}), std::vector<float>{sigmoid(out)});
 }
 
+TEST(SimplePerceptron, EveryUnitMatchesItselfAlone) {
+  // Seven units over nine inputs: units are evaluated in groups, with a remainder.
+  std::vector<std::string> units;
+  for (int j = 0; j < 7; ++j) {
+    std::string unit;
+    for (int k = 0; k < 10; ++k) {
+      unit += " " + std::to_string((j * 7 + k * 3) % 11 - 5) + "." + std::to_string(k + j);
+    }
+    units.push_back(unit);
+  }
+  std::string text = "1 10 7";
+  for (const auto& unit : units) text += unit;
+  const std::vector<float> x{0.5f, -1.25f, 2, 0.125f, 3, -0.75f, 1, 0.3f, -2};
+  const std::vector<float> all = Forward(LoadNetwork(text), x);
+  ASSERT_EQ(all.size(), 7u);
+  for (int j = 0; j < 7; ++j) {
+    EXPECT_EQ(Forward(LoadNetwork("1 10 1" + units[j]), x), std::vector<float>{all[j]}) << j;
+  }
+}
+
 TEST(SimplePerceptron, SumsStayInSinglePrecision) {
   // 1000 terms of 1e-8 each vanish one by one against a bias of 1 in single precision; a
   // double accumulator would reach 1.00001, whose sigmoid differs in the float result.
@@ -205,6 +225,20 @@ TEST(SimplePerceptron, RefusesFilesCutShortOrOversized) {
   for (int i = 0; i < 20; ++i) wide += " 4294967295";
   EXPECT_EQ(LoadError(wide), "neural network too large: more than 16777216 weights");
   EXPECT_EQ(LoadError("2 1 4294967295 5"), "neural network too large: more than 16777216 weights");
+}
+
+TEST(SimplePerceptron, FirstStrideZeroNeverRuns) {
+  // S = 0 declares -1 inputs; wrapped strides then declare no weights at all.
+  const SimplePerceptron network = LoadNetwork("2 0 4294967295 5");
+  EXPECT_TRUE(network.weights().empty());
+  try {
+    Forward(network, {});
+    FAIL();
+  } catch (const ap::Error& e) {
+    EXPECT_STREQ(e.what(),
+                 "SimplePerceptron::calc input size different from upper layer neuron input "
+                 "size: 0 != 4294967295");
+  }
 }
 
 TEST(SimplePerceptron, KeepsItsNetworkWhenALoadFails) {
