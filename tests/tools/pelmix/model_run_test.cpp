@@ -1,0 +1,158 @@
+// pelmix model run, on a model in a directory and the same model packed in a container.
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <filesystem>
+#include <fstream>
+#include <map>
+#include <sstream>
+#include <string>
+
+#include "engine/kb/simple_solver.h"
+#include "engine/ml/deep_solver.h"
+#include "tests/engine/ml/model_test_files.h"
+#include "tests/tools/pelmix/cli_runner.h"
+#include "tools/kbtools/container_writer.h"
+
+namespace {
+
+namespace fs = std::filesystem;
+using pelmix::testing::CliRun;
+using pelmix::testing::RunCli;
+
+const std::map<std::string, std::string> kModel = {
+    {"web.flow",
+     R"({"convs":{"n":{"type":"neur","src":"models/n.net"},"r":{"type":"rules","src":"r.rules"},)"
+     R"("s":{"type":"sqrtboost"}},"flow":[{"name":"enc","input":[[0,3]],"conv":"r"},)"
+     R"({"name":"net","input":["enc"],"conv":"n"},{"name":"out","input":["net"],"conv":"s"}]})"},
+    {"r.rules", "2 1 2 1 0 3 1 2 3"},
+    {"models/n.net", "1 6 2 0 1 1 1 1 1 0 1 1 1 1 1"},
+    {"boost.flow",
+     R"({"convs":{"s":{"type":"sqrtboost"}},"flow":[{"name":"a","input":[[0,2]],"conv":"s"}]})"},
+};
+
+class ModelRun : public ::testing::Test {
+ protected:
+  void SetUp() override {
+    dir_ = fs::temp_directory_path() /
+           ("pelmix_model_run_" + std::to_string(getpid()) + "_" +
+            ::testing::UnitTest::GetInstance()->current_test_info()->name());
+    fs::remove_all(dir_);
+    pelmix::kbtools::ContainerWriter writer;
+    for (const auto& [name, bytes] : kModel) {
+      Write(dir_ / "model" / name, bytes);
+      writer.Add(name, bytes);
+    }
+    Write(dir_ / "model.kb", writer.Build());
+  }
+  void TearDown() override { fs::remove_all(dir_); }
+
+  static void Write(const fs::path& path, const std::string& bytes) {
+    fs::create_directories(path.parent_path());
+    std::ofstream(path, std::ios::binary) << bytes;
+  }
+
+  CliRun Run(const std::string& args, const std::string& input, bool withStderr = false) {
+    Write(dir_ / "input.txt", input);
+    return RunCli("model run " + args + " < " + (dir_ / "input.txt").string(), withStderr);
+  }
+
+  std::string Dir() const { return "--dir " + (dir_ / "model").string(); }
+  std::string Kb() const { return "--kb " + (dir_ / "model.kb").string(); }
+
+  fs::path dir_;
+};
+
+TEST_F(ModelRun, PrintsOutputsAndDecision) {
+  const CliRun run = Run(Dir() + " boost.flow", "0.25 0.81\n0.9999\t0.99999\n");
+  EXPECT_EQ(run.status, 0);
+  EXPECT_EQ(run.out,
+            "0.0625 0.899999976\t0\t0\t0.0625\t.06 .89\n"
+            "0.999949992 0.999994993\t1\t1\t0.999949992\t1 1\n");
+  // A wider radius for loud reports keeps the detection quiet.
+  EXPECT_EQ(Run(Dir() + " boost.flow --threshold-loud 0.5", "0.9999 0.99999").out,
+            "0.999949992 0.999994993\t1\t0\t0.999949992\t1 1\n");
+  EXPECT_EQ(Run(Dir() + " boost.flow --threshold 0", "0.9999 0.99999").out,
+            "0.999949992 0.999994993\t0\t0\t0.999949992\t1 1\n");
+}
+
+TEST_F(ModelRun, DirectoryAndContainerAgreeWithTheEngine) {
+  const std::string input = "1.5 7 2.5\n0 0 0\n3 1 0.5\nnan inf -inf\n";
+  const CliRun fromDir = Run(Dir() + " web.flow", input);
+  const CliRun fromKb = Run(Kb() + " web.flow", input);
+  EXPECT_EQ(fromDir.status, 0);
+  EXPECT_EQ(fromDir.out, fromKb.out);
+
+  // The same lines, made in process from the same files.
+  const loaders_misc::SimpleSolver solver(
+      "web.flow", std::make_shared<pelmix::testing::MemoryFileSystem>(kModel));
+  const float thresholds[2] = {0.01f, 0.0f};
+  std::istringstream lines(input);
+  std::string expected, line;
+  while (std::getline(lines, line)) {
+    std::istringstream numbers(line);
+    std::vector<float> features;
+    for (std::string token; numbers >> token;) features.push_back(std::stof(token));
+    std::vector<float> outputs;
+    solver.model().calc(features, outputs);
+    ASSERT_EQ(outputs.size(), 2u);
+    const auto decision = solver.Solve(features, thresholds);
+    char text[128];
+    std::snprintf(text, sizeof text, "%.9g %.9g\t%d\t%d\t%.9g\t", outputs[0], outputs[1],
+                  decision.detected, decision.outside_loud, decision.weight);
+    expected += text + decision.annotation + "\n";
+  }
+  EXPECT_EQ(fromDir.out, expected);
+}
+
+TEST_F(ModelRun, LineErrorsAreReportedInPlace) {
+  const CliRun run = Run(Dir() + " web.flow", "1 2\n1 x 3\n0.5 7 0\n");
+  EXPECT_EQ(run.status, 1);
+  std::istringstream lines(run.out);
+  std::string line;
+  ASSERT_TRUE(std::getline(lines, line));
+  EXPECT_EQ(line, "error\tDeep solver flow enc reads features [0, 3) of an input of 2");
+  ASSERT_TRUE(std::getline(lines, line));
+  EXPECT_EQ(line, "error\tnot a number: x");
+  ASSERT_TRUE(std::getline(lines, line));
+  // The run went on: the third line is answered (two outputs, four decision fields).
+  EXPECT_NE(line.rfind("error", 0), 0u) << line;
+  EXPECT_EQ(std::count(line.begin(), line.end(), '\t'), 4) << line;
+  EXPECT_FALSE(std::getline(lines, line));
+
+  const CliRun longLine = Run(Dir() + " boost.flow", std::string(1 << 21, ' ') + "\n0.5 0.5\n");
+  EXPECT_EQ(longLine.out,
+            "error\tfeature line longer than 1048576 bytes\n0.25 0.25\t0\t0\t0.25\t.25 .25\n");
+}
+
+TEST_F(ModelRun, ConstructionErrorsStopTheRun) {
+  CliRun run = Run(Dir() + " mail.flow", "1\n", true);
+  EXPECT_EQ(run.status, 1);
+  EXPECT_EQ(run.out, "pelmix: model run: Absent flow file mail.flow\n");
+  Write(dir_ / "model" / "bad.flow", R"({"convs":{},"flow":[{"name":"a"}]})");
+  run = Run(Dir() + " bad.flow", "1\n", true);
+  EXPECT_EQ(run.status, 1);
+  EXPECT_EQ(run.out,
+            "pelmix: model run: Deep solver config error: Wrong number of parameters in flow\n");
+  // Sources outside the directory are not reachable.
+  Write(dir_ / "model" / "escape.flow",
+        R"({"convs":{"r":{"type":"rules","src":"../model/r.rules"}},"flow":[]})");
+  run = Run(Dir() + " escape.flow", "", true);
+  EXPECT_EQ(run.out,
+            "pelmix: model run: Deep solver config error: Absent conversion source "
+            "../model/r.rules\n");
+}
+
+TEST_F(ModelRun, BadCommandLines) {
+  EXPECT_EQ(Run("web.flow", "").status, 64);
+  EXPECT_EQ(Run(Dir() + " " + Kb() + " web.flow", "").status, 64);
+  EXPECT_EQ(Run(Dir(), "").status, 64);
+  EXPECT_EQ(Run(Dir() + " web.flow --threshold", "").status, 64);
+  EXPECT_EQ(Run(Dir() + " web.flow --threshold abc", "").status, 64);
+  EXPECT_EQ(Run(Dir() + " web.flow --frob", "").status, 64);
+  EXPECT_EQ(Run(Dir() + " web.flow boost.flow", "").status, 64);
+  EXPECT_EQ(Run("--kb /nonexistent.kb web.flow", "").status, 1);
+}
+
+}  // namespace
