@@ -17,36 +17,10 @@
 #include "engine/html/char_class.h"
 #include "engine/html/state_machine.h"
 #include "engine/html/tokenizer_handler.h"
+#include "engine/html/tokenizer_parts.h"
 #include "engine/html/void_elements.h"
 
 namespace html {
-
-// Text, comment and script text are handed on in pieces of at most this size.
-inline constexpr std::size_t kTextChunkBytes = 1024;
-// Bytes of a tag name beyond this are ignored.
-inline constexpr std::size_t kMaxTagNameBytes = 1024;
-// Bytes of an attribute name beyond this are dropped; no name worth reporting is this long.
-inline constexpr std::size_t kMaxAttributeNameBytes = 1024;
-// A collected attribute value keeps at most this many bytes (inline data URLs of images are
-// the longest real values); the rest is dropped so that a hostile page cannot make us hold it.
-inline constexpr std::size_t kMaxAttributeValueBytes = std::size_t{1} << 20;
-
-// Closing literals of the raw-text elements and the name reported when they end.
-struct ScriptCloseTrait {
-  static constexpr std::string_view kLiteral = "</script>";
-  static constexpr std::string_view kName = "script";
-  static constexpr bool kDelivers = true;  // the text goes to scriptText
-};
-struct StyleCloseTrait {
-  static constexpr std::string_view kLiteral = "</style>";
-  static constexpr std::string_view kName = "style";
-  static constexpr bool kDelivers = false;  // read and discarded
-};
-struct NoscriptCloseTrait {
-  static constexpr std::string_view kLiteral = "</noscript>";
-  static constexpr std::string_view kName = "noscript";
-  static constexpr bool kDelivers = false;
-};
 
 template <typename Char, typename Handler, typename Config = DefaultConfig<Handler, Char>>
 class FastParserMachine
@@ -69,76 +43,8 @@ class FastParserMachine
   bool selfClosing() const { return selfClosing_; }
 
  private:
-  // A tag name: fixed storage, later bytes ignored once full.
-  class TagName {
-   public:
-    void append(Byte b) {
-      if (size_ < kMaxTagNameBytes) data_[size_++] = static_cast<Char>(b);
-    }
-    StringView view() const { return StringView(data_, size_); }
-    bool endsWithSlash() const { return size_ > 0 && data_[size_ - 1] == '/'; }
-    void dropLast() { --size_; }
-
-   private:
-    Char data_[kMaxTagNameBytes];
-    std::size_t size_ = 0;
-  };
-
-  // An attribute name or value that keeps its first Limit bytes but remembers the last byte
-  // seen, so that a trailing '/' is noticed even past the limit.
-  template <std::size_t Limit>
-  class BoundedText {
-   public:
-    void append(Byte b) {
-      last_ = b;
-      if (text_.size() < Limit) {
-        text_.push_back(static_cast<Char>(b));
-      } else {
-        truncated_ = true;
-      }
-    }
-    bool empty() const { return text_.empty(); }
-    bool endsWithSlash() const { return !text_.empty() && last_ == '/'; }
-    void dropSlash() {
-      if (!truncated_) text_.pop_back();
-      last_ = text_.empty() ? 0 : static_cast<Byte>(text_.back());
-    }
-    StringView view() const { return text_; }
-    void clear() {
-      text_.clear();
-      truncated_ = false;
-      last_ = 0;
-    }
-
-   private:
-    std::basic_string<Char> text_;
-    Byte last_ = 0;
-    bool truncated_ = false;
-  };
-
-  // Fixed-size collector for text, comments and raw text.
-  class ChunkBuffer {
-   public:
-    template <typename Flush>
-    void append(Byte b, Flush&& flush) {
-      data_[count_++] = static_cast<Char>(b);
-      if (count_ == kTextChunkBytes) {
-        count_ = 0;
-        flush(data_, kTextChunkBytes);
-      }
-    }
-    template <typename Flush>
-    void flushIfAny(Flush&& flush) {
-      if (count_ == 0) return;
-      const std::size_t n = count_;
-      count_ = 0;
-      flush(data_, n);
-    }
-
-   private:
-    Char data_[kTextChunkBytes];
-    std::size_t count_ = 0;
-  };
+  using TagName = html::FixedText<Char, kMaxTagNameBytes>;
+  using Buffer = ChunkBuffer<Char, kTextChunkBytes>;
 
   class TagWaitState;
   class TagState;
@@ -209,7 +115,7 @@ class FastParserMachine
     }
 
    private:
-    ChunkBuffer buffer_;
+    Buffer buffer_;
   };
 
   // After '<'.
@@ -317,20 +223,6 @@ class FastParserMachine
     Transition process(Byte b) override { return b == '>' ? util::PopReprocess(1) : util::Stay(); }
   };
 
-  // Tracks the last two bytes to find the "-->" that ends a comment.
-  class CommentEnd {
-   public:
-    bool closes(Byte b) const { return b == '>' && prev2_ == '-' && prev1_ == '-'; }
-    void shift(Byte b) {
-      prev2_ = prev1_;
-      prev1_ = b;
-    }
-
-   private:
-    Byte prev1_ = 0;
-    Byte prev2_ = 0;
-  };
-
   using CommentSink = typename Config::CommentSink;
 
   // Comment text goes to the sink, ending with the two '-' of its closing.
@@ -354,7 +246,7 @@ class FastParserMachine
 
    private:
     CommentSink* sink_;
-    ChunkBuffer buffer_;
+    Buffer buffer_;
     CommentEnd end_;
   };
 
@@ -415,7 +307,7 @@ class FastParserMachine
       return pushValueWait(m, mode, reprocess);
     }
 
-    BoundedText<kMaxAttributeNameBytes> name_;
+    BoundedText<Char, kMaxAttributeNameBytes> name_;
   };
 
   // Names of the attributes of an element nobody asked about: only a trailing '/' matters.
@@ -489,7 +381,7 @@ class FastParserMachine
     }
 
    private:
-    BoundedText<kMaxAttributeValueBytes> value_;
+    BoundedText<Char, kMaxAttributeValueBytes> value_;
   };
 
   template <char Q>
@@ -505,7 +397,7 @@ class FastParserMachine
     }
 
    private:
-    BoundedText<kMaxAttributeValueBytes> value_;
+    BoundedText<Char, kMaxAttributeValueBytes> value_;
   };
 
   class AttrStreamValue final : public state_t {
@@ -597,7 +489,7 @@ class FastParserMachine
     }
 
    private:
-    ChunkBuffer buffer_;
+    Buffer buffer_;
     std::size_t matched_ = 0;
     Byte held_[Trait::kLiteral.size()];
   };
