@@ -41,45 +41,12 @@ TEST(EntityTable, HoldsTheHtml4SetsPlusAposSortedByName) {
 }
 
 TEST(EntityTable, SampleCodePointsOfEachSet) {
-  const std::pair<const char*, std::uint32_t> samples[] = {// Latin-1
-                                                           {"nbsp", 0xA0},
-                                                           {"copy", 0xA9},
-                                                           {"iquest", 0xBF},
-                                                           {"AElig", 0xC6},
-                                                           {"eacute", 0xE9},
-                                                           {"yuml", 0xFF},
-                                                           // symbols
-                                                           {"fnof", 0x192},
-                                                           {"Alpha", 0x391},
-                                                           {"Omega", 0x3A9},
-                                                           {"sigmaf", 0x3C2},
-                                                           {"thetasym", 0x3D1},
-                                                           {"piv", 0x3D6},
-                                                           {"hellip", 0x2026},
-                                                           {"image", 0x2111},
-                                                           {"alefsym", 0x2135},
-                                                           {"crarr", 0x21B5},
-                                                           {"hArr", 0x21D4},
-                                                           {"empty", 0x2205},
-                                                           {"lowast", 0x2217},
-                                                           {"there4", 0x2234},
-                                                           {"sdot", 0x22C5},
-                                                           {"lang", 0x2329},
-                                                           {"loz", 0x25CA},
-                                                           {"diams", 0x2666},
-                                                           // special
-                                                           {"quot", 0x22},
-                                                           {"amp", 0x26},
-                                                           {"lt", 0x3C},
-                                                           {"gt", 0x3E},
-                                                           {"OElig", 0x152},
-                                                           {"Yuml", 0x178},
-                                                           {"tilde", 0x2DC},
-                                                           {"zwj", 0x200D},
-                                                           {"permil", 0x2030},
-                                                           {"euro", 0x20AC},
-                                                           // beyond HTML 4.01
-                                                           {"apos", 0x27}};
+  const std::pair<const char*, std::uint32_t> samples[] = {
+      {"nbsp", 0xA0},    {"iquest", 0xBF},  {"AElig", 0xC6},   {"yuml", 0xFF},       // Latin-1
+      {"fnof", 0x192},   {"Omega", 0x3A9},  {"sigmaf", 0x3C2}, {"thetasym", 0x3D1},  // symbols
+      {"image", 0x2111}, {"crarr", 0x21B5}, {"sdot", 0x22C5},  {"diams", 0x2666},
+      {"quot", 0x22},    {"OElig", 0x152},  {"tilde", 0x2DC},  {"euro", 0x20AC},  // special
+      {"apos", 0x27}};
   for (const auto& [name, code] : samples) {
     const std::string decoded = Decode(name);
     ASSERT_NE(decoded, "fail") << name;

@@ -141,13 +141,6 @@ TEST(Tokenizer, CommentsEndWithTheirClosingDashes) {
   EXPECT_EQ(Tokenize("<!DOCTYPE html>"), (Events{"open:!doctype", "attr:html", "tagend"}));
 }
 
-TEST(Tokenizer, LongCommentsComeInPieces) {
-  const std::string body(1500, 'c');
-  EXPECT_EQ(Tokenize("<!--" + body + "-->"),
-            (Events{"comment:" + std::string(1024, 'c'), "comment:" + std::string(476, 'c') + "--",
-                    "comment_end"}));
-}
-
 TEST(Tokenizer, LongNamesAreCut) {
   const std::string name(2000, 'n');
   const std::string kept(html::kMaxTagNameBytes, 'n');
@@ -168,20 +161,6 @@ TEST(Tokenizer, CollectedValuesAreCutButStillSeeTheirSlash) {
             (Events{"open:a", "attr:href", "value:" + kept, "tagend", "close:a"}));
   EXPECT_EQ(Tokenize("<a href='" + value + "'>"),
             (Events{"open:a", "attr:href", "value:" + kept, "tagend"}));
-}
-
-TEST(Tokenizer, StackNeverGrowsPastNineStates) {
-  RecordingHandler::Policy stream;
-  stream.defaultMode = html::kAttrStream;
-  RecordingHandler handler(stream);
-  html_test::Tokenizer tokenizer(handler);
-  EXPECT_EQ(tokenizer.depth(), 1u);
-  const std::string doc = "<a href=x/";
-  tokenizer.feed(doc.data(), doc.size());
-  EXPECT_EQ(tokenizer.depth(), 9u);
-  tokenizer.feed(">", 1);
-  EXPECT_EQ(tokenizer.depth(), 1u);
-  EXPECT_TRUE(tokenizer.selfClosing());
 }
 
 }  // namespace
