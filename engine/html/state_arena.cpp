@@ -1,0 +1,50 @@
+#include "engine/html/state_arena.h"
+
+#include <algorithm>
+#include <cassert>
+#include <new>
+#include <stdexcept>
+
+namespace util {
+
+StateArena::~StateArena() {
+  while (count_ > 0) ::operator delete(blocks_[--count_].base);
+}
+
+void* StateArena::allocate(std::size_t size) {
+  size = std::max<std::size_t>(size, 1);
+  size = (size + kAlignment - 1) / kAlignment * kAlignment;
+  if (count_ > 0) {
+    Block& current = blocks_[count_ - 1];
+    if (current.size - current.used >= size) {
+      void* p = current.base + current.used;
+      current.used += size;
+      return p;
+    }
+  }
+  if (count_ == kMaxBlocks) throw std::runtime_error("StateMachine: state arena exhausted");
+  const std::size_t blockSize = count_ == 0
+                                    ? kFirstBlockFactor * size
+                                    : std::max(kGrowthFactor * size, 2 * blocks_[count_ - 1].size);
+  Block& block = blocks_[count_];
+  block.base = static_cast<std::byte*>(::operator new(blockSize));
+  block.size = blockSize;
+  block.used = size;
+  ++count_;
+  return block.base;
+}
+
+void StateArena::release(void* p) {
+  assert(count_ > 0);
+  Block& current = blocks_[count_ - 1];
+  auto* position = static_cast<std::byte*>(p);
+  assert(position >= current.base && position < current.base + current.used);
+  current.used = static_cast<std::size_t>(position - current.base);
+  if (current.used == 0) {
+    ::operator delete(current.base);
+    current = Block{};
+    --count_;
+  }
+}
+
+}  // namespace util

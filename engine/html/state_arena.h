@@ -1,0 +1,44 @@
+// The LIFO arena that holds the states of a push-down machine. States are pushed and popped
+// strictly in stack order, so the arena is a chain of bump blocks: popping a state hands its
+// address back as the next free position, and a block that becomes empty is freed at once.
+#pragma once
+
+#include <cstddef>
+
+namespace util {
+
+class StateArena {
+ public:
+  static constexpr std::size_t kMaxBlocks = 10;
+  // The first block holds this many copies of the first request.
+  static constexpr std::size_t kFirstBlockFactor = 50;
+  // A later block is the larger of this many copies of the request and twice its predecessor.
+  static constexpr std::size_t kGrowthFactor = 100;
+  // Every allocation is rounded up to this, so any state type is suitably aligned.
+  static constexpr std::size_t kAlignment = alignof(std::max_align_t);
+
+  StateArena() = default;
+  ~StateArena();
+  StateArena(const StateArena&) = delete;
+  StateArena& operator=(const StateArena&) = delete;
+
+  // Throws std::runtime_error "StateMachine: state arena exhausted" when the request fits in
+  // no block and all kMaxBlocks are in use.
+  void* allocate(std::size_t size);
+  // `p` must be the most recent allocation still live.
+  void release(void* p);
+
+  std::size_t blockCount() const { return count_; }
+  std::size_t blockSize(std::size_t index) const { return blocks_[index].size; }
+
+ private:
+  struct Block {
+    std::byte* base = nullptr;
+    std::size_t size = 0;
+    std::size_t used = 0;
+  };
+  Block blocks_[kMaxBlocks];
+  std::size_t count_ = 0;  // blocks allocated; the last one is current
+};
+
+}  // namespace util

@@ -1,0 +1,137 @@
+// The push-down byte machine under every scanner of markup and script. A machine is a stack
+// of state objects; each input byte goes to the top state, whose answer (a transition) may
+// push a new state, pop states, and ask for the same byte to be offered again to the new top.
+// Scanners never look back: everything they remember lives in their states.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <new>
+#include <stdexcept>
+#include <type_traits>
+#include <utility>
+
+#include "engine/html/state_arena.h"
+
+namespace util {
+
+// What a state answers for one byte. Pushes are carried out by the state itself (see Push
+// below) before it returns, so a transition only says how many states to pop (the answering
+// state counts as one) and whether the byte is to be offered again.
+struct Transition {
+  std::uint8_t pops = 0;
+  bool reprocess = false;
+};
+
+constexpr Transition Stay() { return {}; }
+constexpr Transition Pop(std::uint8_t n) { return {n, false}; }
+constexpr Transition PopReprocess(std::uint8_t n) { return {n, true}; }
+
+// Machine is the concrete machine (CRTP); its states reach it through State::machine().
+template <typename Char, typename Machine>
+class StateMachine {
+ public:
+  // Bytes are handed to states as unsigned values whatever the signedness of Char.
+  using Byte = std::make_unsigned_t<Char>;
+
+  class State {
+   public:
+    virtual Transition process(Byte byte) = 0;
+    virtual ~State() = default;
+
+    State* below() const { return below_; }
+    Machine& machine() const { return *machine_; }
+
+   private:
+    friend class StateMachine;
+    State* below_ = nullptr;
+    Machine* machine_ = nullptr;
+  };
+
+  // A state that collects bytes and hands them on in pieces.
+  class BufferedState : public State {
+   public:
+    virtual void flush(const Char* data, std::size_t length) = 0;
+  };
+
+  StateMachine() = default;
+  ~StateMachine() {
+    while (top_ != nullptr) destroyTop();
+  }
+  StateMachine(const StateMachine&) = delete;
+  StateMachine& operator=(const StateMachine&) = delete;
+
+  void feed(const Char* data, std::size_t length) {
+    for (std::size_t i = 0; i < length; ++i) feedByte(static_cast<Byte>(data[i]));
+  }
+
+  void feedByte(Byte byte) {
+    do {
+      reprocess_ = false;
+      const Transition t = top_->process(byte);
+      if (t.pops != 0) pop(t.pops);
+      reprocess_ = t.reprocess;
+    } while (reprocess_);
+  }
+
+  State* top() const { return top_; }
+  std::size_t depth() const { return depth_; }
+  const StateArena& arena() const { return arena_; }
+
+  // Constructs S on top of the stack. Meant for states (through Push) and for the concrete
+  // machine's constructor, which pushes the bottom state.
+  template <typename S, typename... Args>
+  S& pushState(Args&&... args) {
+    static_assert(std::is_base_of_v<State, S>);
+    void* storage = arena_.allocate(sizeof(S));
+    S* state;
+    try {
+      state = ::new (storage) S(std::forward<Args>(args)...);
+    } catch (...) {
+      arena_.release(storage);
+      throw;
+    }
+    state->below_ = top_;
+    state->machine_ = static_cast<Machine*>(this);
+    top_ = state;
+    ++depth_;
+    return *state;
+  }
+
+  // Pops n states, the top one first. Removing the bottom state is a fault of the machine.
+  void pop(std::size_t n) {
+    if (n >= depth_)
+      throw std::runtime_error("StateMachine: trying to pop state in depth over the stack");
+    while (n-- > 0) destroyTop();
+  }
+
+ private:
+  void destroyTop() {
+    State* state = top_;
+    top_ = state->below_;
+    --depth_;
+    void* storage = dynamic_cast<void*>(state);  // the most derived object, as allocated
+    state->~State();
+    arena_.release(storage);
+  }
+
+  StateArena arena_;  // destroyed after the states, which the destructor pops first
+  State* top_ = nullptr;
+  std::size_t depth_ = 0;
+  bool reprocess_ = false;
+};
+
+// Transitions that push: `return Push<Next>(this->machine(), args...);`
+template <typename S, typename Machine, typename... Args>
+Transition Push(Machine& machine, Args&&... args) {
+  machine.template pushState<S>(std::forward<Args>(args)...);
+  return {};
+}
+
+template <typename S, typename Machine, typename... Args>
+Transition PushReprocess(Machine& machine, Args&&... args) {
+  machine.template pushState<S>(std::forward<Args>(args)...);
+  return {0, true};
+}
+
+}  // namespace util
