@@ -15,7 +15,7 @@ namespace loaders_misc {
 namespace {
 
 using Decision = WebCheckerV3Data::Decision;
-using pelmix::testing::MemoryFileSystem;
+using pelmix::testing::PieceFileSystem;
 
 // A model that answers with fixed outputs, whatever the features.
 class FixedModel final : public WebCheckerV3Data::AbstractNetI {
@@ -114,7 +114,7 @@ const char kFlow[] =
     R"({"convs":{"s":{"type":"sqrtboost"}},"flow":[{"name":"a","input":[[0,2]],"conv":"s"}]})";
 
 TEST(SimpleSolver, LoadsItsModelFromAnEntry) {
-  auto files = std::make_shared<MemoryFileSystem>(
+  auto files = std::make_shared<PieceFileSystem>(
       std::map<std::string, std::string>{{"web.flow", kFlow}}, 3);
   const SimpleSolver solver("web.flow", files);
   const float thresholds[2] = {0.01f, 0.0f};
@@ -130,7 +130,7 @@ TEST(SimpleSolver, LoadsItsModelFromAnEntry) {
 TEST(SimpleSolver, RefusesMissingBrokenAndOversizedEntries) {
   const auto failure = [](std::map<std::string, std::string> files) -> std::string {
     try {
-      SimpleSolver("mail.flow", std::make_shared<MemoryFileSystem>(std::move(files)));
+      SimpleSolver("mail.flow", std::make_shared<PieceFileSystem>(std::move(files)));
     } catch (const std::exception& e) {
       return e.what();
     }

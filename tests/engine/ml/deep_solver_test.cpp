@@ -17,11 +17,11 @@
 namespace ml {
 namespace {
 
-using pelmix::testing::MemoryFileSystem;
+using pelmix::testing::PieceFileSystem;
 
 // Rules over three features and a network of 2 + 1 + 3 encoded inputs to two outputs.
-std::shared_ptr<MemoryFileSystem> ModelFiles() {
-  return std::make_shared<MemoryFileSystem>(std::map<std::string, std::string>{
+std::shared_ptr<PieceFileSystem> ModelFiles() {
+  return std::make_shared<PieceFileSystem>(std::map<std::string, std::string>{
       {"r.rules", "2 1 2 1 0 3 1 2 3"},
       {"n.net", "1 6 2 0 1 1 1 1 1 0 -1 -1 -1 -1 -1"},
       {"junk", "not a model"},

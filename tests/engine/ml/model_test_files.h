@@ -15,11 +15,11 @@
 
 namespace pelmix::testing {
 
-class MemoryFile final : public ap::ReadableFileI {
+class PieceFile final : public ap::ReadableFileI {
  public:
   // `piece` bounds every read: 0 reads whatever is asked, a positive value at most that many
   // bytes, a negative value a random 1 .. -piece bytes (seeded, so runs repeat).
-  explicit MemoryFile(std::string bytes, int piece = 0, unsigned seed = 1)
+  explicit PieceFile(std::string bytes, int piece = 0, unsigned seed = 1)
       : bytes_(std::move(bytes)), piece_(piece), random_(seed) {}
 
   std::int64_t file_seek(std::int64_t position) override {
@@ -47,10 +47,10 @@ class MemoryFile final : public ap::ReadableFileI {
   std::mt19937 random_;
 };
 
-class MemoryFileSystem final : public ap::FileSystemI {
+class PieceFileSystem final : public ap::FileSystemI {
  public:
-  MemoryFileSystem() = default;
-  explicit MemoryFileSystem(std::map<std::string, std::string> files, int piece = 0)
+  PieceFileSystem() = default;
+  explicit PieceFileSystem(std::map<std::string, std::string> files, int piece = 0)
       : files_(std::move(files)), piece_(piece) {}
 
   void Add(const std::string& name, std::string bytes) { files_[name] = std::move(bytes); }
@@ -59,7 +59,7 @@ class MemoryFileSystem final : public ap::FileSystemI {
     ++opens;
     const auto it = files_.find(name);
     if (it == files_.end()) return nullptr;
-    return std::make_shared<MemoryFile>(it->second, piece_);
+    return std::make_shared<PieceFile>(it->second, piece_);
   }
   void enumerate(
       const std::function<void(const std::string& name, std::uint64_t size)>& callback) override {
@@ -74,7 +74,7 @@ class MemoryFileSystem final : public ap::FileSystemI {
 };
 
 inline std::shared_ptr<ap::ReadableFileI> MemoryEntry(std::string bytes, int piece = 0) {
-  return std::make_shared<MemoryFile>(std::move(bytes), piece);
+  return std::make_shared<PieceFile>(std::move(bytes), piece);
 }
 
 }  // namespace pelmix::testing
