@@ -50,8 +50,7 @@ int GetConfidence(std::int32_t protectionLevel) {
       return 0;
     default:
       throw std::runtime_error(
-          (boost::format("GetConfidence: unexpected protection level value - %d") %
-           protectionLevel)
+          (boost::format("GetConfidence: unexpected protection level value - %d") % protectionLevel)
               .str());
   }
 }
@@ -160,14 +159,15 @@ uvo::result_t AntiPhishing::CreateWebSession(const char* place, const SessionSet
 }
 
 uvo::result_t AntiPhishing::CreateSession(const SessionSettings* settings, const char* url,
-                                          const SessionParamList* /*params*/,
-                                          IHttpSession** out) {
+                                          const SessionParamList* /*params*/, IHttpSession** out) {
   return CreateWebSession(kCreateSession, settings, url, out);
 }
 
-uvo::result_t AntiPhishing::CreateSessionWithExternalDataSource(
-    const SessionSettings* settings, const char* url, const SessionParamList* /*params*/,
-    IHttpExternalDataSource* /*source*/, IHttpSession** out) {
+uvo::result_t AntiPhishing::CreateSessionWithExternalDataSource(const SessionSettings* settings,
+                                                                const char* url,
+                                                                const SessionParamList* /*params*/,
+                                                                IHttpExternalDataSource* /*source*/,
+                                                                IHttpSession** out) {
   return CreateWebSession(kCreateSessionWithExternalDataSource, settings, url, out);
 }
 

@@ -50,8 +50,7 @@ class AntiPhishing final : public uvo::ObjectImpl<AntiPhishing, IAntiPhishingSer
   uvo::result_t CreateSession(const SessionSettings* settings, const char* url,
                               const SessionParamList* params, IHttpSession** out) override;
   uvo::result_t CreateSessionWithExternalDataSource(const SessionSettings* settings,
-                                                    const char* url,
-                                                    const SessionParamList* params,
+                                                    const char* url, const SessionParamList* params,
                                                     IHttpExternalDataSource* source,
                                                     IHttpSession** out) override;
   // IMailSessionFactory
