@@ -1,0 +1,24 @@
+#include "engine/html/decrunch.h"
+
+#include <limits>
+
+namespace html {
+
+Decrunch::Decrunch(Handler& receiver, bool nested)
+    : handler_(receiver, nested ? 1 : 0), tokenizer_(handler_) {}
+
+Decrunch::Decrunch(Handler& receiver, NestedIn parent)
+    : handler_(receiver, parent.parentDepth + 1), tokenizer_(handler_) {}
+
+// Members go in reverse order: the tokenizer's states, then the handler (which finishes an
+// open script and ends a nested pipeline), then the JSON validator.
+Decrunch::~Decrunch() = default;
+
+void Decrunch::feed(const char* data, std::size_t length) {
+  constexpr std::uint32_t kMax = std::numeric_limits<std::uint32_t>::max();
+  bytes_ = length >= kMax - bytes_ ? kMax : bytes_ + static_cast<std::uint32_t>(length);
+  tokenizer_.feed(data, length);
+  json_.feed(data, length);
+}
+
+}  // namespace html
