@@ -18,7 +18,12 @@ void Decrunch::feed(const char* data, std::size_t length) {
   constexpr std::uint32_t kMax = std::numeric_limits<std::uint32_t>::max();
   bytes_ = length >= kMax - bytes_ ? kMax : bytes_ + static_cast<std::uint32_t>(length);
   tokenizer_.feed(data, length);
-  json_.feed(data, length);
+  // Once the validator has rejected the document it swallows every byte for ever, so the
+  // rest of the page need not pass through it.
+  if (!jsonRejected_) {
+    json_.feed(data, length);
+    jsonRejected_ = !json_.accepted();
+  }
 }
 
 }  // namespace html

@@ -41,7 +41,7 @@ class Decrunch : public DecrunchInterfaces {
   // Bytes fed so far (saturating at the largest 32-bit value).
   std::uint32_t byteCount() const { return bytes_; }
   // Whether the document so far can still be one JSON value.
-  bool jsonAccepted() const { return json_.accepted(); }
+  bool jsonAccepted() const { return !jsonRejected_ && json_.accepted(); }
   std::size_t depth() const { return handler_.depth(); }
   const html_decrunch::HtmlHandler& handler() const { return handler_; }
 
@@ -50,6 +50,7 @@ class Decrunch : public DecrunchInterfaces {
   utils::JSONStateMachine<char> json_;
   html_decrunch::HtmlHandler handler_;
   FastParserMachine<char, html_decrunch::HtmlHandler> tokenizer_;
+  bool jsonRejected_ = false;
 };
 
 }  // namespace html

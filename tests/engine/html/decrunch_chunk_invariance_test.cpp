@@ -10,28 +10,9 @@
 
 namespace {
 
-std::string Base64(const std::string& bytes) {
-  static constexpr char kDigits[] =
-      "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
-  std::string out;
-  std::uint32_t bits = 0;
-  int held = 0;
-  for (const char c : bytes) {
-    bits = (bits << 8) | static_cast<std::uint8_t>(c);
-    held += 8;
-    while (held >= 6) {
-      held -= 6;
-      out += kDigits[(bits >> held) & 63];
-    }
-  }
-  if (held > 0) out += kDigits[(bits << (6 - held)) & 63];
-  while (out.size() % 4 != 0) out += '=';
-  return out;
-}
-
 std::string Refresh(const std::string& page) {
-  return "<meta http-equiv=\"refresh\" content=\"0; url='data:text/html;base64," + Base64(page) +
-         "'\">";
+  return "<meta http-equiv=\"refresh\" content=\"0; url='data:text/html;base64," +
+         decrunch_test::Base64(page) + "'\">";
 }
 
 std::vector<std::string> TrickyPages() {

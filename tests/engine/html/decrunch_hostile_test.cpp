@@ -8,6 +8,7 @@
 #include <string>
 
 #include "engine/html/decrunch.h"
+#include "tests/engine/html/decrunch_test_support.h"
 
 namespace {
 
@@ -100,29 +101,15 @@ std::string ScriptNest(std::size_t levels) {
   return page;
 }
 
-std::string Base64(const std::string& bytes) {
-  static constexpr char kDigits[] =
-      "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
-  std::string out;
-  std::uint32_t bits = 0;
-  int held = 0;
-  for (const char c : bytes) {
-    bits = (bits << 8) | static_cast<std::uint8_t>(c);
-    for (held += 8; held >= 6;) out += kDigits[(bits >> (held -= 6)) & 63];
-  }
-  if (held > 0) out += kDigits[(bits << (6 - held)) & 63];
-  return out;
-}
-
 std::string RefreshNest(std::size_t levels) {
   std::string page = "<a href=/bottom>bottom</a><br>";
   for (std::size_t i = 0; i < levels; ++i) {
-    page = "<meta content='0;url=data:text/html;base64," + Base64(page) + "'>";
+    page = "<meta content='0;url=data:text/html;base64," + decrunch_test::Base64(page) + "'>";
   }
   return page;
 }
 
-CountingReceiver Decrunch(const std::string& page) {
+CountingReceiver Count(const std::string& page) {
   CountingReceiver receiver;
   {
     html::Decrunch pipeline(receiver, false);
@@ -134,17 +121,17 @@ CountingReceiver Decrunch(const std::string& page) {
 TEST(DecrunchHostile, NestingStopsAtItsLimit) {
   for (const auto& nest : {std::function<std::string(std::size_t)>(ScriptNest),
                            std::function<std::string(std::size_t)>(RefreshNest)}) {
-    const CountingReceiver atLimit = Decrunch(nest(html::kMaxDecrunchNesting));
+    const CountingReceiver atLimit = Count(nest(html::kMaxDecrunchNesting));
     EXPECT_EQ(atLimit.bottoms, 1u);
     EXPECT_EQ(atLimit.maxDepth, html::kMaxDecrunchNesting);
-    const CountingReceiver beyond = Decrunch(nest(html::kMaxDecrunchNesting + 1));
+    const CountingReceiver beyond = Count(nest(html::kMaxDecrunchNesting + 1));
     EXPECT_EQ(beyond.bottoms, 0u);
     EXPECT_EQ(beyond.maxDepth, html::kMaxDecrunchNesting);
     EXPECT_FALSE(atLimit.unbalanced || beyond.unbalanced);
     EXPECT_EQ(beyond.depth, 0u);
   }
   // Far deeper than any stack would survive without the limit.
-  const CountingReceiver deep = Decrunch(ScriptNest(300));
+  const CountingReceiver deep = Count(ScriptNest(300));
   EXPECT_EQ(deep.maxDepth, html::kMaxDecrunchNesting);
   EXPECT_EQ(deep.depth, 0u);
 }
@@ -210,8 +197,8 @@ TEST(DecrunchHostile, FiftyMegabyteAttributeValues) {
 TEST(DecrunchHostile, MetaUrlDecoderGivesUpAfterTooManyRejectedBytes) {
   for (const std::size_t junk :
        {html_decrunch::kMaxMetaUrlRejectedBytes - 1, html_decrunch::kMaxMetaUrlRejectedBytes}) {
-    const CountingReceiver receiver = Decrunch("<meta content=\"0;url=" + std::string(junk, 'j') +
-                                               "data:,<a href=/bottom>x</a>\">");
+    const CountingReceiver receiver =
+        Count("<meta content=\"0;url=" + std::string(junk, 'j') + "data:,<a href=/bottom>x</a>\">");
     EXPECT_EQ(receiver.bottoms, junk < html_decrunch::kMaxMetaUrlRejectedBytes ? 1u : 0u);
   }
 }

@@ -2,6 +2,7 @@
 // through every sink it hands out, as one string per call.
 #pragma once
 
+#include <cstdint>
 #include <memory>
 #include <set>
 #include <string>
@@ -92,6 +93,21 @@ inline Events Decrunched(const std::vector<std::string_view>& chunks,
   }
   recorder.events.push_back(std::string("json:") + (accepted ? "1" : "0"));
   return recorder.events;
+}
+
+// The base64 form of `bytes`, without padding (the data-URL decoder ignores it anyway).
+inline std::string Base64(std::string_view bytes) {
+  static constexpr char kDigits[] =
+      "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
+  std::string out;
+  std::uint32_t bits = 0;
+  int held = 0;
+  for (const char c : bytes) {
+    bits = (bits << 8) | static_cast<std::uint8_t>(c);
+    for (held += 8; held >= 6;) out += kDigits[(bits >> (held -= 6)) & 63];
+  }
+  if (held > 0) out += kDigits[(bits << (6 - held)) & 63];
+  return out;
 }
 
 inline Events Decrunched(std::string_view page, const std::set<std::string>& refused = {}) {
