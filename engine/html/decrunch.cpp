@@ -1,7 +1,5 @@
 #include "engine/html/decrunch.h"
 
-#include <limits>
-
 namespace html {
 
 Decrunch::Decrunch(Handler& receiver, bool nested)
@@ -15,8 +13,7 @@ Decrunch::Decrunch(Handler& receiver, NestedIn parent)
 Decrunch::~Decrunch() = default;
 
 void Decrunch::feed(const char* data, std::size_t length) {
-  constexpr std::uint32_t kMax = std::numeric_limits<std::uint32_t>::max();
-  bytes_ = length >= kMax - bytes_ ? kMax : bytes_ + static_cast<std::uint32_t>(length);
+  bytes_ = addByteCount(bytes_, length);
   tokenizer_.feed(data, length);
   // Once the validator has rejected the document it swallows every byte for ever, so the
   // rest of the page need not pass through it.

@@ -19,6 +19,13 @@
 
 namespace html {
 
+// The pipeline's byte count after `added` more bytes: it stops at the largest 32-bit value
+// rather than wrapping round to a small count.
+constexpr std::uint32_t addByteCount(std::uint32_t total, std::size_t added) {
+  constexpr std::uint32_t kMax = 0xFFFFFFFFu;
+  return added >= kMax - total ? kMax : total + static_cast<std::uint32_t>(added);
+}
+
 class Decrunch : public DecrunchInterfaces {
  public:
   // A nested pipeline tells the receiver beginNested now and endNested when it is destroyed.

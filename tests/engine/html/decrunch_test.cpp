@@ -41,6 +41,10 @@ TEST(DecrunchSinks, TitleTextReachesOnlyTheTitle) {
   EXPECT_EQ(Decrunched("<title>Sign &amp; in</title>rest<br><title>a&amp</title>;b<br>"),
             (Events{"sink:title", "title.text:Sign & in", "title.end", "text:rest", "break",
                     "sink:title", "title.text:a", "title.end", "text:&b", "break", "json:0"}));
+  // A title that was never closed ends before the next one asks for its sink.
+  EXPECT_EQ(Decrunched("<title>a<title>b</title>"),
+            (Events{"sink:title", "title.text:a", "title.end", "sink:title", "title.text:b",
+                    "title.end", "json:0"}));
   // Without a title sink the title is page text; a body start tag closes an open head.
   EXPECT_EQ(Decrunched("<head><title>T<body>x<br>", {"title"}),
             (Events{"text:T", "text:x", "break", "json:0"}));
@@ -89,14 +93,16 @@ TEST(DecrunchTags, InputRules) {
 
 TEST(DecrunchTags, MetaDescriptionAndItsFallback) {
   // Content read before the name is refresh content; giving up makes it fallback text, which
-  // the description receives at the end of the tag.
+  // the description receives at the end of the tag. A second content goes to the open sink.
   EXPECT_EQ(
-      Decrunched("<meta name=Description content=\"Hi\">"
-                 "<meta content=\"Old\" name=description content=\"New\">"
-                 "<meta content=\"5\" name=description>"),
+      Decrunched(
+          "<meta name=Description content=\"Hi\">"
+          "<meta content=\"Old\" name=description content=\"New\">"
+          "<meta content=\"5\" name=description><meta name=description content=a content=b>"),
       (Events{"sink:description", "description.text:H", "description.text:i", "description.end",
               "sink:description", "description.text:N", "description.text:e", "description.text:w",
-              "description.text:Old", "description.end", "json:0"}));
+              "description.text:Old", "description.end", "sink:description", "description.text:a",
+              "description.text:b", "description.end", "json:0"}));
 }
 
 TEST(DecrunchRefresh, DataUrlBehindARefreshIsAPageOfItsOwn) {
@@ -145,6 +151,9 @@ TEST(DecrunchPipeline, CountsBytesAndKeepsTheJsonVerdict) {
   pipeline.feed("{\"a\": [1, ", 10);
   pipeline.feed("\"<b>\"]}", 7);
   EXPECT_EQ(pipeline.byteCount(), 17u);
+  EXPECT_EQ(html::addByteCount(0xFFFFFFF0u, 15), 0xFFFFFFFFu);
+  EXPECT_EQ(html::addByteCount(0xFFFFFFF0u, 16), 0xFFFFFFFFu);  // no wrap round to 0
+  EXPECT_EQ(html::addByteCount(5, std::size_t{1} << 40), 0xFFFFFFFFu);
   EXPECT_TRUE(pipeline.jsonAccepted());
   pipeline.feed(" x", 2);
   EXPECT_FALSE(pipeline.jsonAccepted());
