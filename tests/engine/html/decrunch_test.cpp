@@ -123,6 +123,9 @@ TEST(DecrunchScripts, StringsGoToTheScriptSinkAndUrlsAreReported) {
                        "\n  s = ' \\u0041%41';</script>"),
             (Events{"sink:script:/a b.js", "script.text:http://evil.example/p?x\" AA'",
                     "script_url:evil.example/p", "script.end", "json:0"}));
+  // Bytes of 0x80 and above are never blanks.
+  EXPECT_EQ(Decrunched("<script>s = '\xE9t\xE9'</script>"),
+            (Events{"sink:script:", "script.text:\xE9t\xE9'", "script.end", "json:0"}));
   // Leading blanks are dropped; closing quotes are string text. A script without strings
   // asks for no sink.
   EXPECT_EQ(Decrunched("<script>a = ' \\n'; b = \"\"</script><script>x = 1 / 2;</script>"),
