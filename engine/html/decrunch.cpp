@@ -1,0 +1,26 @@
+#include "engine/html/decrunch.h"
+
+namespace html {
+
+Decrunch::Decrunch(Handler& receiver, bool nested)
+    : handler_(receiver, nested ? 1 : 0), tokenizer_(handler_) {}
+
+Decrunch::Decrunch(Handler& receiver, NestedIn parent)
+    : handler_(receiver, parent.parentDepth + 1), tokenizer_(handler_) {}
+
+// Members go in reverse order: the tokenizer's states, then the handler (which finishes an
+// open script and ends a nested pipeline), then the JSON validator.
+Decrunch::~Decrunch() = default;
+
+void Decrunch::feed(const char* data, std::size_t length) {
+  bytes_ = addByteCount(bytes_, length);
+  tokenizer_.feed(data, length);
+  // Once the validator has rejected the document it swallows every byte for ever, so the
+  // rest of the page need not pass through it.
+  if (!jsonRejected_) {
+    json_.feed(data, length);
+    jsonRejected_ = !json_.accepted();
+  }
+}
+
+}  // namespace html
