@@ -180,12 +180,12 @@ void WordsDB<Ch, Stats>::Load(std::istream& in) {
     // The phrases may not be the whole entry: an empty line here fails to parse.
     if (!next()) line.clear();
   }
-  while (lexemes) {  // lexeme lines, the current one first
+  while (lexemes) {  // lexeme lines, the current one (already counted) first
     const ParsedLine parsed = Parse(line);
-    ++lines;
     if (parsed.lexeme.empty()) break;
     trie_.Insert(parsed.lexeme, allocator, parsed.stats);
     if (!next() || line.empty()) break;
+    ++lines;
   }
   AP_TRACE(ap::kSeverityMessage) << lines << " lines loaded during lex load";
 
