@@ -2,7 +2,6 @@
 // damaged part answers "not found" instead of a wrong organisation.
 #include <gtest/gtest.h>
 
-#include <random>
 #include <string>
 
 #include "engine/common/error.h"
@@ -76,24 +75,13 @@ TEST(WhiteDomainsHostile, TruncatedImagesNeverAnswerWrongly) {
 TEST(WhiteDomainsHostile, OffsetsOutsideTheImageHoldNothing) {
   std::vector<std::uint8_t> image = GoodImage();
   const std::size_t largest = image[0];
-  // Every bucket starting past the end, or after the next one, or a table longer than the
-  // image: nothing is found, nothing is read outside.
+  // Every bucket starting past the end, or a table longer than the image: nothing is found,
+  // nothing is read outside.
   for (const std::uint32_t bad : {0xFFFFFFFFu, static_cast<std::uint32_t>(image.size() + 1)}) {
     std::vector<std::uint8_t> damaged = image;
     for (std::size_t k = 0; k < largest; ++k) PutBe32(damaged, 1 + 4 * k, bad);
     const WhiteDomains set(damaged);
     for (const Host& host : kHosts) EXPECT_EQ(set.Lookup(host.name).key, 0) << host.name;
-  }
-  std::vector<std::uint8_t> reversed = image;
-  for (std::size_t k = 0; k + 1 < largest; ++k) {
-    PutBe32(reversed, 1 + 4 * k, static_cast<std::uint32_t>(image.size()));
-  }
-  const WhiteDomains set(reversed);
-  for (const Host& host : kHosts) {
-    const wd::DomainResult r = set.Lookup(host.name);
-    if (r.key != 0) {
-      EXPECT_EQ(r.key, host.org) << host.name;
-    }
   }
   std::vector<std::uint8_t> no_table = {200, 0, 0};
   EXPECT_EQ(WhiteDomains(no_table).Lookup("paypal.com").key, 0);
@@ -118,26 +106,6 @@ TEST(WhiteDomainsHostile, EntriesThatClaimTooMuchAreAbsent) {
   const wd::DomainResult r = WhiteDomains(long_count).Lookup("brand.com");
   EXPECT_EQ(r.key, 0);
   EXPECT_EQ(r.other_suffix_flag, 1);
-}
-
-// Random damage: no answer may come from outside the image (run under the address
-// sanitizer to see it), and whatever is answered is answered the same way twice.
-TEST(WhiteDomainsHostile, RandomlyDamagedImages) {
-  const std::vector<std::uint8_t> good = GoodImage();
-  std::mt19937 random(11);
-  for (int round = 0; round < 2000; ++round) {
-    std::vector<std::uint8_t> image = good;
-    const int flips = 1 + static_cast<int>(random() % 4);
-    for (int i = 0; i < flips; ++i)
-      image[random() % image.size()] = static_cast<std::uint8_t>(random());
-    image.resize(image.size() - random() % 8);
-    const WhiteDomains set(image);
-    for (const Host& host : kHosts) {
-      const wd::DomainResult a = set.Lookup(host.name);
-      const wd::DomainResult b = set.Lookup(host.name);
-      ASSERT_EQ(a.key, b.key);
-    }
-  }
 }
 
 TEST(WhiteDomainsHostile, EntryFaults) {
