@@ -10,8 +10,61 @@ namespace cf::services::anti_phishing {
 // Class identifier the host passes to uvoGetObjectFactory.
 inline constexpr std::uint32_t kAntiPhishingClassId = 0xD0FFBC1E;
 
-class IHttpSessionFactory;
-class IMailSessionFactory;
+// Passed by the host when it creates a session.
+struct SessionSettings {
+  std::int32_t protectionLevel;  // 1, 2 or 3
+};
+
+// A name/value pair of zero-terminated 8-bit strings.
+struct SessionParam {
+  const char* name;
+  const char* value;
+};
+
+// A contiguous range of parameters, [begin, end).
+struct SessionParamList {
+  const SessionParam* begin;
+  const SessionParam* end;
+};
+
+class IHttpSession;
+class IMailSession;
+class IHttpExternalSink;
+
+// A host object that can fetch further data for a page into a sink.
+class IHttpExternalDataSource : public uvo::IObject {
+ public:
+  virtual uvo::result_t Request(const char* url, IHttpExternalSink* sink) = 0;  // slot 3
+
+ protected:
+  ~IHttpExternalDataSource() = default;
+};
+
+class IHttpSessionFactory : public uvo::IObject {
+ public:
+  static constexpr uvo::iid_t kIid = 0x6C5E6D58;
+  virtual uvo::result_t CreateSession(const SessionSettings* settings, const char* url,
+                                      const SessionParamList* params,
+                                      IHttpSession** out) = 0;  // slot 3
+  virtual uvo::result_t CreateSessionWithExternalDataSource(const SessionSettings* settings,
+                                                            const char* url,
+                                                            const SessionParamList* params,
+                                                            IHttpExternalDataSource* source,
+                                                            IHttpSession** out) = 0;  // slot 4
+
+ protected:
+  ~IHttpSessionFactory() = default;
+};
+
+class IMailSessionFactory : public uvo::IObject {
+ public:
+  static constexpr uvo::iid_t kIid = 0x85A13322;
+  virtual uvo::result_t CreateSession(const SessionSettings* settings,
+                                      IMailSession** out) = 0;  // slot 3
+
+ protected:
+  ~IMailSessionFactory() = default;
+};
 
 class IAntiPhishingService : public uvo::IObject {
  public:
