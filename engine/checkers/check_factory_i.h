@@ -14,8 +14,7 @@ class ExtraCheckerI;
 
 class CheckFactoryI {
  public:
-  virtual std::shared_ptr<WebCheckerI> CreateWebChecker(const std::string& url,
-                                                        int confidence) = 0;
+  virtual std::shared_ptr<WebCheckerI> CreateWebChecker(const std::string& url, int confidence) = 0;
   virtual std::shared_ptr<MailCheckerI> CreateMailChecker(int confidence) = 0;
   // This engine makes no third kind of checker: always empty.
   virtual std::shared_ptr<ExtraCheckerI> CreateExtraChecker() = 0;

@@ -1,9 +1,18 @@
-// The loaded knowledge of one check factory. Only the decision interfaces live here so far:
-// a checker hands its feature vector to a Solver, which runs an AbstractNetI model on it.
+// The loaded knowledge of one check factory: every knowledge base of the container, the two
+// decision objects and the configuration. The loader fills it once; afterwards it is
+// read-only and shared, without locks, by the factory and every checker it made.
 #pragma once
 
+#include <memory>
 #include <string>
 #include <vector>
+
+#include "engine/kb/categorized_hosts.h"
+#include "engine/kb/engine_config.h"
+#include "engine/kb/hosts_pathes_db.h"
+#include "engine/kb/lexeme_stats.h"
+#include "engine/kb/white_domain_i.h"
+#include "engine/kb/words_db.h"
 
 class WebCheckerV3Data {
  public:
@@ -30,4 +39,13 @@ class WebCheckerV3Data {
     virtual Decision Solve(const std::vector<float>& features, const float* thresholds) const = 0;
     virtual ~Solver() = default;
   };
+
+  // Filled by the loader in this order of fields; the configuration is read last.
+  std::shared_ptr<ap::WhiteDomainI> whiteDomains;
+  std::shared_ptr<ap::HostsPathesDB> shareLinks;
+  std::shared_ptr<ap::CategorizedHostsPathesDB> categorisedHosts;
+  lex::WordsDB<char, lex::LexemeStats> lexemes;
+  std::shared_ptr<Solver> webSolver;
+  std::shared_ptr<Solver> mailSolver;
+  ap::EngineConfig config;
 };

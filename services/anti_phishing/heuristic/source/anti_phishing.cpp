@@ -5,6 +5,7 @@
 #include <new>
 #include <stdexcept>
 
+#include "engine/checkers/check_factory_v3.h"
 #include "framework/uvo/exception.h"
 #include "framework/uvo/result.h"
 #include "internal/helpers/io_adapters/antiphishing_io_adapter.h"
@@ -39,6 +40,10 @@ std::string SessionPrefix(const char* kind) {
 }
 
 }  // namespace
+
+std::shared_ptr<ap::easy2::CheckFactoryI> BuildCheckFactory(std::shared_ptr<ap::FileIO> file) {
+  return std::make_shared<easy3_impl::CheckFactoryV3>(std::move(file));
+}
 
 int GetConfidence(std::int32_t protectionLevel) {
   switch (protectionLevel) {

@@ -5,6 +5,7 @@
 #include "internal/helpers/service_locator/service_locator_socks.h"
 #include "internal/helpers/tracer/trace_writer.h"
 #include "internal/helpers/tracer/tracer_socks.h"
+#include "services/anti_phishing/heuristic/source/anti_phishing.h"
 
 namespace cf::services::anti_phishing::heuristic {
 namespace {
@@ -44,10 +45,13 @@ uvo::result_t AntiPhishingFactory::CreateAntiPhishingService(uvo::IStream* knowl
     UVO_CHECK(*out == nullptr);
     helpers::Trace(services_.tracer.Get(), 700,
                    std::string(kCreateService) + " creating anti-phishing service instance..");
-    // The service itself is not part of this build yet: report it instead of handing out
-    // an object that cannot answer.
-    throw uvo::ResultCodeException(uvo::SourceBaseName(__FILE__), __LINE__, kCreateService,
-                                   uvo::kErrNotImplemented);
+    AntiPhishing* service =
+        AntiPhishing::Create(services_.locator.Get(), knowledgeFile, tracerHolder_);
+    UVO_CHECK(service != nullptr);
+    helpers::Trace(services_.tracer.Get(), 600,
+                   std::string(kCreateService) + " anti-phishing service instance created");
+    *out = service;  // the creation reference goes to the host
+    return uvo::kOk;
   } catch (...) {
     return dispatcher_.Dispatch(kCreateService);
   }

@@ -143,21 +143,25 @@ TEST_F(ModuleAbi, CreateServiceChecksItsArguments) {
   }
 }
 
-TEST_F(ModuleAbi, CreateServiceTracesThenReportsNotImplemented) {
+TEST_F(ModuleAbi, CreateServiceOnAFileThatIsNoContainer) {
   uvo::Ptr<IAntiPhishingServiceFactory> factory = CreateServiceFactory();
   ASSERT_TRUE(factory);
+  // Two bytes: the container's header read runs past the end of the host file.
   auto file = pelmix::host::MemoryStream::Create(std::string("kb"));
   IAntiPhishingService* out = nullptr;
-  EXPECT_EQ(factory->CreateAntiPhishingService(file.Get(), &out), uvo::kErrNotImplemented);
+  EXPECT_EQ(factory->CreateAntiPhishingService(file.Get(), &out), uvo::kErrUnexpected);
   EXPECT_EQ(out, nullptr);
   const auto lines = host_.tracer->Lines();
-  ASSERT_EQ(lines.size(), 2u);
+  ASSERT_EQ(lines.size(), 3u);
   EXPECT_EQ(lines[0].level, 700);
   EXPECT_EQ(lines[0].text,
             std::string(kCreateService) + " creating anti-phishing service instance..");
-  EXPECT_EQ(lines[1].level, 300);
-  EXPECT_EQ(lines[1].text, std::string(kCreateService) +
-                               ": uvo::ResultCodeException 0x80000043 (Not implemented)");
+  EXPECT_EQ(lines[1].level, 700);
+  EXPECT_EQ(lines[1].text,
+            "anti_phishing_service\tcf::services::anti_phishing::heuristic::AntiPhishing::"
+            "Initialize creating heuristic checker factory..");
+  EXPECT_EQ(lines[2].level, 300);
+  EXPECT_EQ(lines[2].text, std::string(kCreateService) + ": uvo::Exception ");
   factory.Reset();
   EXPECT_EQ(module_.CanUnload(), 0);
   EXPECT_EQ(host_.allocator->LiveBlocks(), 0u);

@@ -1,0 +1,30 @@
+#include "engine/checkers/check_factory_v3.h"
+
+#include <stdexcept>
+
+#include "engine/kb/kb_loader.h"
+
+namespace easy3_impl {
+
+std::shared_ptr<const WebCheckerV3Data> CheckFactoryV3::Load(std::shared_ptr<ap::FileIO> file) {
+  auto knowledge = std::make_shared<WebCheckerV3Data>();
+  loaders_misc::load(*knowledge, std::move(file));
+  return knowledge;
+}
+
+CheckFactoryV3::CheckFactoryV3(std::shared_ptr<ap::FileIO> file)
+    : knowledge_(Load(std::move(file))), whiteDomains_(*knowledge_->whiteDomains) {}
+
+std::shared_ptr<ap::easy2::WebCheckerI> CheckFactoryV3::CreateWebChecker(const std::string&, int) {
+  throw std::runtime_error("CheckFactoryV3: web checking is not available in this build");
+}
+
+std::shared_ptr<ap::easy2::MailCheckerI> CheckFactoryV3::CreateMailChecker(int) {
+  throw std::runtime_error("CheckFactoryV3: mail checking is not available in this build");
+}
+
+bool CheckFactoryV3::IsWhiteDomain(const std::string& domain) {
+  return ap::IsWhite(whiteDomains_.Lookup(domain.data(), domain.data() + domain.size()));
+}
+
+}  // namespace easy3_impl
