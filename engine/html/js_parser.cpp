@@ -120,8 +120,11 @@ template <typename Quote>
 class JSParser<Char>::ScriptStringState final : public state_t {
  public:
   ~ScriptStringState() override {
-    if (count_ > 0) {
+    if (count_ == 0) return;
+    try {
       AP_TRACE(ap::kSeverityMessage) << "SCRIPT STRING " << count_ << " chars unflushed";
+    } catch (...) {
+      // A trace line must not end the process from a destructor.
     }
   }
   Transition process(std::uint8_t b) override {

@@ -37,9 +37,14 @@ uvo::result_t ModuleFactory::CreateInstance(uvo::IServiceLocator* locator, uvo::
     UVO_CHECK(allocator);
     factory = AntiPhishingFactory::CreateWithAllocator(allocator.Get(), locator);
   } catch (...) {
-    const helpers::DispatchedException caught = helpers::ClassifyCurrentException();
-    TraceConstructionFailure(locator, caught.text);
-    return caught.code;
+    // Classifying composes a message, which may itself run out of memory.
+    try {
+      const helpers::DispatchedException caught = helpers::ClassifyCurrentException();
+      TraceConstructionFailure(locator, caught.text);
+      return caught.code;
+    } catch (...) {
+      return uvo::kErrOutOfMemory;
+    }
   }
   const uvo::result_t constructed = factory->FinalConstruct();
   if (constructed < 0) {
