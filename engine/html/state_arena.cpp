@@ -9,6 +9,7 @@ namespace util {
 
 StateArena::~StateArena() {
   while (count_ > 0) ::operator delete(blocks_[--count_].base);
+  ::operator delete(spare_.base);
 }
 
 void* StateArena::allocate(std::size_t size) {
@@ -27,8 +28,14 @@ void* StateArena::allocate(std::size_t size) {
                                     ? kFirstBlockFactor * size
                                     : std::max(kGrowthFactor * size, 2 * blocks_[count_ - 1].size);
   Block& block = blocks_[count_];
-  block.base = static_cast<std::byte*>(::operator new(blockSize));
-  block.size = blockSize;
+  if (spare_.base != nullptr && spare_.size >= blockSize) {
+    block = spare_;
+    spare_ = Block{};
+  } else {
+    block.base = static_cast<std::byte*>(::operator new(blockSize));
+    block.size = blockSize;
+    ++heapAllocations_;
+  }
   block.used = size;
   ++count_;
   return block.base;
@@ -41,7 +48,8 @@ void StateArena::release(void* p) {
   assert(position >= current.base && position < current.base + current.used);
   current.used = static_cast<std::size_t>(position - current.base);
   if (current.used == 0) {
-    ::operator delete(current.base);
+    ::operator delete(spare_.base);
+    spare_ = current;
     current = Block{};
     --count_;
   }

@@ -1,6 +1,8 @@
 // The LIFO arena that holds the states of a push-down machine. States are pushed and popped
 // strictly in stack order, so the arena is a chain of bump blocks: popping a state hands its
-// address back as the next free position, and a block that becomes empty is freed at once.
+// address back as the next free position, and a block that becomes empty is given up. The
+// last block given up is kept aside and reused by the next block of no larger size, so that
+// input pushing and popping right at a block edge does not allocate on every byte.
 #pragma once
 
 #include <cstddef>
@@ -30,6 +32,8 @@ class StateArena {
 
   std::size_t blockCount() const { return count_; }
   std::size_t blockSize(std::size_t index) const { return blocks_[index].size; }
+  // How many blocks were taken from the heap over the arena's life.
+  std::size_t heapAllocations() const { return heapAllocations_; }
 
  private:
   struct Block {
@@ -38,7 +42,9 @@ class StateArena {
     std::size_t used = 0;
   };
   Block blocks_[kMaxBlocks];
-  std::size_t count_ = 0;  // blocks allocated; the last one is current
+  std::size_t count_ = 0;  // blocks in use; the last one is current
+  Block spare_;            // the last block given up, kept for reuse
+  std::size_t heapAllocations_ = 0;
 };
 
 }  // namespace util
