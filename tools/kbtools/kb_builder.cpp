@@ -15,11 +15,8 @@
 #include "tools/kbtools/white_domains_compiler.h"
 
 namespace pelmix::kbtools {
-namespace {
 
-namespace fs = std::filesystem;
-
-std::string ReadWholeFile(const fs::path& path) {
+std::string ReadWholeFile(const std::filesystem::path& path) {
   std::ifstream in(path, std::ios::binary);
   if (!in) throw std::runtime_error(path.string() + ": cannot be read");
   std::ostringstream bytes;
@@ -27,6 +24,10 @@ std::string ReadWholeFile(const fs::path& path) {
   if (in.bad()) throw std::runtime_error(path.string() + ": read failed");
   return std::move(bytes).str();
 }
+
+namespace {
+
+namespace fs = std::filesystem;
 
 bool LoadsEmptyWhenEmpty(const std::string& name) {
   return name == ap::kOrgsEntry || name == lex::kLexdbEntry || name == ap::kShareLinksEntry;

@@ -15,10 +15,14 @@
 #pragma once
 
 #include <filesystem>
+#include <string>
 
 #include "tools/kbtools/container_writer.h"
 
 namespace pelmix::kbtools {
+
+// The bytes of a file; raises std::runtime_error naming the file when it cannot be read.
+std::string ReadWholeFile(const std::filesystem::path& path);
 
 inline constexpr char kWhiteDomainsSource[] = "white_domains.txt";
 inline constexpr char kCategorisedHostsSource[] = "categorised_hosts.txt";

@@ -6,21 +6,13 @@
 #include <sstream>
 
 #include "tools/kbtools/container_writer.h"
+#include "tools/kbtools/kb_builder.h"
 #include "tools/pelmix/command.h"
 
 namespace pelmix::cli {
 namespace {
 
 namespace fs = std::filesystem;
-
-std::string ReadWholeFile(const fs::path& path) {
-  std::ifstream in(path, std::ios::binary);
-  if (!in) throw std::runtime_error(path.string() + ": cannot be read");
-  std::ostringstream bytes;
-  bytes << in.rdbuf();
-  if (in.bad()) throw std::runtime_error(path.string() + ": read failed");
-  return std::move(bytes).str();
-}
 
 // Every regular file under `dir`, named by its path relative to `dir` with '/' separators.
 void AddDirectory(const fs::path& dir, const fs::path& out, kbtools::ContainerWriter& writer) {
@@ -29,7 +21,8 @@ void AddDirectory(const fs::path& dir, const fs::path& out, kbtools::ContainerWr
     if (!entry.is_regular_file()) continue;
     // A container written into the directory it packs must not swallow its old self.
     if (fs::equivalent(entry.path(), out, ignored)) continue;
-    writer.Add(entry.path().lexically_relative(dir).generic_string(), ReadWholeFile(entry.path()));
+    writer.Add(entry.path().lexically_relative(dir).generic_string(),
+               kbtools::ReadWholeFile(entry.path()));
   }
 }
 
@@ -47,7 +40,7 @@ int RunKbPack(const std::vector<std::string>& args, const GlobalOptions&) {
         if (equals == std::string::npos || equals == 0) {
           return UsageError("kb pack: expected a directory or NAME=PATH, got " + args[i]);
         }
-        writer.Add(args[i].substr(0, equals), ReadWholeFile(args[i].substr(equals + 1)));
+        writer.Add(args[i].substr(0, equals), kbtools::ReadWholeFile(args[i].substr(equals + 1)));
       }
     }
     const std::string bytes = writer.Build();
