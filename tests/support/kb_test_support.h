@@ -18,6 +18,8 @@
 #include "framework/uvo/result.h"
 #include "host/stream.h"
 #include "internal/helpers/io_adapters/antiphishing_io_adapter.h"
+#include "tests/support/error_of.h"
+#include "tools/kbtools/container_writer.h"
 
 namespace pelmix::testing {
 
@@ -82,6 +84,14 @@ inline std::shared_ptr<ap::FileIO> AdapterOver(const std::string& bytes) {
 
 inline std::shared_ptr<ap::PackedFile> OpenPacked(const std::string& bytes) {
   return std::make_shared<ap::PackedFile>(AdapterOver(bytes));
+}
+
+// A container made by the writer from (name, data) pairs, opened through the adapter.
+inline std::shared_ptr<ap::PackedFile> PackedOf(
+    const std::vector<std::pair<std::string, std::string>>& entries) {
+  kbtools::ContainerWriter writer;
+  for (const auto& [name, data] : entries) writer.Add(name, data);
+  return OpenPacked(writer.Build());
 }
 
 // A lenient ap::FileIO over bytes: reads stop short at the end and seeks outside the

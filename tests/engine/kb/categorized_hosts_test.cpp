@@ -5,6 +5,7 @@
 
 #include "engine/common/error.h"
 #include "engine/kb/md5.h"
+#include "tests/support/kb_test_support.h"
 #include "tests/support/kbdb_test_support.h"
 #include "tools/kbtools/hpdb_writer.h"
 
@@ -47,12 +48,7 @@ std::string Ask(const HashedCatHostsPathes& db, const std::string& host, const s
 }
 
 std::string ErrorOf(const std::string& bytes) {
-  try {
-    HashedCatHostsPathes db(Entry(bytes));
-  } catch (const ap::Error& e) {
-    return e.what();
-  }
-  return "no error";
+  return pelmix::testing::ErrorOf([&] { HashedCatHostsPathes db(Entry(bytes)); });
 }
 
 TEST(HashedCatHostsPathes, FirstMatchingPrefixInFileOrder) {
@@ -132,12 +128,7 @@ TEST(HashedCatHostsPathes, TruncatedAndDamagedEntries) {
 TEST(HashedCatHostsPathes, ReadFailureIsAnError) {
   auto entry = Entry(HostSection("h.com", 1) + HostSection("g.com", 2));
   entry->fail_after = 21;
-  try {
-    HashedCatHostsPathes db(entry);
-    FAIL() << "no error";
-  } catch (const ap::Error& e) {
-    EXPECT_STREQ(e.what(), "HDBP: Can't read");
-  }
+  EXPECT_EQ(pelmix::testing::ErrorOf([&] { HashedCatHostsPathes db(entry); }), "HDBP: Can't read");
 }
 
 TEST(HashedCatHostsPathes, ReadsWhatTheWriterWrites) {

@@ -7,22 +7,13 @@
 
 #include "engine/common/error.h"
 #include "tests/support/kb_test_support.h"
-#include "tools/kbtools/container_writer.h"
 
 namespace {
 
 using ap::EngineConfig;
 using ap::ParseCfgString;
 
-template <class Call>
-std::string ErrorOf(Call&& call) {
-  try {
-    call();
-  } catch (const ap::Error& e) {
-    return e.what();
-  }
-  return "no error";
-}
+using pelmix::testing::ErrorOf;
 
 std::pair<std::string, std::string> Parsed(std::string_view line) {
   const ap::CfgString cfg = ParseCfgString(line);
@@ -34,33 +25,38 @@ std::pair<std::string, std::string> Parsed(std::string_view line) {
 
 using Pair = std::pair<std::string, std::string>;
 
-TEST(CfgString, KeyAndUnquotedValue) {
-  EXPECT_EQ(Parsed("key=value;"), Pair("key", "value"));
-  EXPECT_EQ(Parsed("key \t = \t value;rest"), Pair("key", "value"));
-  EXPECT_EQ(Parsed(" key=1;"), Pair(" key", "1")) << "leading blanks belong to the key";
-  EXPECT_EQ(Parsed("key=1 ;"), Pair("key", "1 ")) << "blanks before ';' belong to the value";
-  EXPECT_EQ(Parsed("key=a=b;c;"), Pair("key", "a=b"));
-  EXPECT_EQ(Parsed("=1;"), Pair("", "1"));
-  EXPECT_EQ(Parsed("key=1;\r"), Pair("key", "1"));
-}
-
-TEST(CfgString, QuotedValue) {
-  EXPECT_EQ(Parsed("k=\"a b;c\""), Pair("k", "a b;c"));
-  EXPECT_EQ(Parsed("k= \"x\" trailing, no semicolon"), Pair("k", "x"));
-  EXPECT_EQ(Parsed(R"(k="a\"b")"), Pair("k", R"(a\"b)")) << "escapes are kept as written";
-  EXPECT_EQ(Parsed(R"(k="a\\")"), Pair("k", R"(a\\)"));
-  EXPECT_EQ(Parsed("k=\"\""), Pair("k", ""));
+TEST(CfgString, KeyAndValue) {
+  const std::pair<std::string_view, Pair> cases[] = {
+      {"key=value;", {"key", "value"}},
+      {"key \t = \t value;rest", {"key", "value"}},
+      {" key=1;", {" key", "1"}},  // leading blanks belong to the key
+      {"key=1 ;", {"key", "1 "}},  // blanks before ';' belong to the value
+      {"key=a=b;c;", {"key", "a=b"}},
+      {"=1;", {"", "1"}},
+      {"key=1;\r", {"key", "1"}},
+      {"k=\"a b;c\"", {"k", "a b;c"}},
+      {"k= \"x\" trailing, no semicolon", {"k", "x"}},
+      {R"(k="a\"b")", {"k", R"(a\"b)"}},  // escapes are kept as written
+      {R"(k="a\\")", {"k", R"(a\\)"}},
+      {"k=\"\"", {"k", ""}},
+  };
+  for (const auto& [line, parts] : cases) EXPECT_EQ(Parsed(line), parts) << line;
 }
 
 TEST(CfgString, Messages) {
-  EXPECT_EQ(ErrorOf([] { ParseCfgString(""); }), "Wrong cfg string, '=' not found");
-  EXPECT_EQ(ErrorOf([] { ParseCfgString("key value;"); }), "Wrong cfg string, '=' not found");
-  EXPECT_EQ(ErrorOf([] { ParseCfgString("key= ;"); }), "No value in cfg string");
-  EXPECT_EQ(ErrorOf([] { ParseCfgString("key=1"); }), "';' not found in cfg string");
-  EXPECT_EQ(ErrorOf([] { ParseCfgString("key=  \t"); }), "';' not found in cfg string");
-  EXPECT_EQ(ErrorOf([] { ParseCfgString("key="); }), "';' not found in cfg string");
-  EXPECT_EQ(ErrorOf([] { ParseCfgString("key=\"open;"); }), "Invalid quoted value in cfg");
-  EXPECT_EQ(ErrorOf([] { ParseCfgString(R"(key="escaped\")"); }), "Invalid quoted value in cfg");
+  const std::pair<std::string_view, const char*> cases[] = {
+      {"", "Wrong cfg string, '=' not found"},
+      {"key value;", "Wrong cfg string, '=' not found"},
+      {"key= ;", "No value in cfg string"},
+      {"key=1", "';' not found in cfg string"},
+      {"key=  \t", "';' not found in cfg string"},
+      {"key=", "';' not found in cfg string"},
+      {"key=\"open;", "Invalid quoted value in cfg"},
+      {R"(key="escaped\")", "Invalid quoted value in cfg"},
+  };
+  for (const auto& [line, message] : cases) {
+    EXPECT_EQ(ErrorOf([&] { ParseCfgString(line); }), message) << line;
+  }
 }
 
 EngineConfig Read(std::string_view text) {
@@ -99,22 +95,25 @@ TEST(EngineConfig, EveryKey) {
 }
 
 TEST(EngineConfig, ValueConversions) {
-  EXPECT_EQ(Read("web_threshold = 0.05;\n").web.threshold, 0.05f);
-  EXPECT_EQ(Read("web_threshold\t=\t0.05;\n").web.threshold, 0.05f);
-  EXPECT_EQ(Read(" dbstamp=5;\n").dbstamp, 0u) << "a blank before the key makes another key";
-  EXPECT_EQ(Read("dbstamp=\"12345\"\n").dbstamp, 12345u) << "a quoted value is what it quotes";
-  EXPECT_EQ(Read("dbstamp=123abc;\n").dbstamp, 123u);
-  EXPECT_EQ(Read("dbstamp=abc;\n").dbstamp, 0u);
-  EXPECT_EQ(Read("dbstamp=-5;\n").dbstamp, 0u);
-  EXPECT_EQ(Read("dbstamp=4294967297;\n").dbstamp, 1u);
+  const std::pair<std::string_view, std::uint32_t> stamps[] = {
+      {" dbstamp=5;\n", 0},            // a blank before the key makes another key
+      {"dbstamp=\"12345\"\n", 12345},  // a quoted value is what it quotes
+      {"dbstamp=123abc;\n", 123},     {"dbstamp=abc;\n", 0},           {"dbstamp=-5;\n", 0},
+      {"dbstamp=4294967297;\n", 1},   {"dbstamp=1;\ndbstamp=2;\n", 2},  // the later line wins
+  };
+  for (const auto& [text, stamp] : stamps) EXPECT_EQ(Read(text).dbstamp, stamp) << text;
+  const std::pair<std::string_view, float> thresholds[] = {
+      {"web_threshold = 0.05;\n", 0.05f},
+      {"web_threshold\t=\t0.05;\n", 0.05f},
+      {"web_threshold=1e39;\n", HUGE_VALF},
+      {"web_threshold=-1e300;\n", -HUGE_VALF},
+      {"web_threshold=3.4028235e38;\n", 3.4028235e38f},
+  };
+  for (const auto& [text, value] : thresholds) EXPECT_EQ(Read(text).web.threshold, value) << text;
   EXPECT_TRUE(Read("web_loud=2;\n").web.loud);
   EXPECT_FALSE(Read("web_loud=-1;\n").web.loud);
   EXPECT_FALSE(Read("web_loud=0;\n").web.loud);
   EXPECT_FALSE(Read("mail_loud=yes;\n").mail.loud);
-  EXPECT_EQ(Read("dbstamp=1;\ndbstamp=2;\n").dbstamp, 2u) << "the later line wins";
-  EXPECT_EQ(Read("web_threshold=1e39;\n").web.threshold, HUGE_VALF);
-  EXPECT_EQ(Read("web_threshold=-1e300;\n").web.threshold, -HUGE_VALF);
-  EXPECT_EQ(Read("web_threshold=3.4028235e38;\n").web.threshold, 3.4028235e38f);
 }
 
 TEST(EngineConfig, Lines) {
@@ -140,34 +139,29 @@ TEST(EngineConfig, AnyFaultAbortsTheWholeRead) {
   EXPECT_EQ(config.web.threshold, 0.05f);
 }
 
-std::shared_ptr<ap::PackedFile> Container(
-    std::vector<std::pair<std::string, std::string>> entries) {
-  pelmix::kbtools::ContainerWriter writer;
-  for (auto& [name, data] : entries) writer.Add(name, data);
-  return pelmix::testing::OpenPacked(writer.Build());
-}
+using pelmix::testing::PackedOf;
 
 TEST(EngineConfig, LoadsFromTheContainer) {
   EngineConfig config;
-  ap::LoadEngineConfig(*Container({{"v3.cfg", "dbstamp=42;\nmail_loud=1;\n"}, {"x", "y"}}), config);
+  ap::LoadEngineConfig(*PackedOf({{"v3.cfg", "dbstamp=42;\nmail_loud=1;\n"}, {"x", "y"}}), config);
   EXPECT_EQ(config.dbstamp, 42u);
   EXPECT_TRUE(config.mail.loud);
 
   EngineConfig untouched;
-  ap::LoadEngineConfig(*Container({{"v3.cfg", ""}}), untouched);
+  ap::LoadEngineConfig(*PackedOf({{"v3.cfg", ""}}), untouched);
   EXPECT_EQ(untouched.dbstamp, 0u) << "an empty entry sets nothing";
 
   EXPECT_EQ(ErrorOf([] {
               EngineConfig c;
-              ap::LoadEngineConfig(*Container({{"V3.cfg", "dbstamp=1;\n"}}), c);
+              ap::LoadEngineConfig(*PackedOf({{"V3.cfg", "dbstamp=1;\n"}}), c);
             }),
             "Configuration entry v3.cfg not found");
   EXPECT_EQ(ErrorOf([] {
               EngineConfig c;
               std::string big(ap::kMaxEngineConfigSize - 11, 'x');
-              ap::LoadEngineConfig(*Container({{"v3.cfg", "dbstamp=1;\n" + big}}), c);
+              ap::LoadEngineConfig(*PackedOf({{"v3.cfg", "dbstamp=1;\n" + big}}), c);
               EXPECT_EQ(c.dbstamp, 1u) << "the limit itself is accepted";
-              ap::LoadEngineConfig(*Container({{"v3.cfg", "dbstamp=1;\n" + big + "x"}}), c);
+              ap::LoadEngineConfig(*PackedOf({{"v3.cfg", "dbstamp=1;\n" + big + "x"}}), c);
             }),
             "Configuration v3.cfg is too large");
 }

@@ -7,31 +7,17 @@
 #include <random>
 
 #include "engine/common/error.h"
+#include "tests/support/kb_test_support.h"
 
 namespace {
 
 using ap::FloatParser;
 
-std::string ErrorOf(const std::string& text) {
-  try {
-    FloatParser::Parse(text);
-  } catch (const ap::Error& e) {
-    return e.what();
-  }
-  return "no error";
-}
-
 TEST(FloatParser, ShortForms) {
-  EXPECT_EQ(FloatParser::Parse("0.05"), 0.05);
-  EXPECT_EQ(FloatParser::Parse("-0.5"), -0.5);
-  EXPECT_EQ(FloatParser::Parse("1e-3"), 0.001);
-  EXPECT_EQ(FloatParser::Parse("1E+3"), 1000.0);
-  EXPECT_EQ(FloatParser::Parse("+.5"), 0.5);
-  EXPECT_EQ(FloatParser::Parse("5."), 5.0);
-  EXPECT_EQ(FloatParser::Parse("5e"), 5.0);
-  EXPECT_EQ(FloatParser::Parse("."), 0.0);
-  EXPECT_EQ(FloatParser::Parse("007"), 7.0);
-  EXPECT_EQ(FloatParser::Parse("123.456e2"), 12345.6);
+  const std::pair<const char*, double> cases[] = {
+      {"0.05", 0.05}, {"-0.5", -0.5}, {"1e-3", 0.001}, {"1E+3", 1000.0}, {"+.5", 0.5},
+      {"5.", 5.0},    {"5e", 5.0},    {".", 0.0},      {"007", 7.0},     {"123.456e2", 12345.6}};
+  for (const auto& [text, value] : cases) EXPECT_EQ(FloatParser::Parse(text), value) << text;
   const double empty = FloatParser::Parse("");
   EXPECT_EQ(empty, 0.0);
   EXPECT_FALSE(std::signbit(empty));
@@ -41,17 +27,18 @@ TEST(FloatParser, ShortForms) {
 }
 
 TEST(FloatParser, Messages) {
-  EXPECT_EQ(ErrorOf("1.2.3"), "FloatParser: wrong fraction symbol");
-  EXPECT_EQ(ErrorOf("12a"), "FloatParser: wrong fraction symbol");
-  EXPECT_EQ(ErrorOf("0.05 "), "FloatParser: wrong fraction symbol");
-  EXPECT_EQ(ErrorOf("7 "), "FloatParser: wrong fraction symbol");
-  EXPECT_EQ(ErrorOf("--1"), "FloatParser: wrong fraction symbol");
-  EXPECT_EQ(ErrorOf("e5"), "FloatParser: wrong first symbol");
-  EXPECT_EQ(ErrorOf(" 1"), "FloatParser: wrong first symbol");
-  EXPECT_EQ(ErrorOf("1e+-2"), "FloatParser: wrong exponenta symbol");
-  EXPECT_EQ(ErrorOf("1e5."), "FloatParser: wrong exponenta symbol");
-  EXPECT_EQ(ErrorOf("1ex"), "FloatParser: wrong first exponenta symbol");
-  EXPECT_EQ(ErrorOf("1e "), "FloatParser: wrong first exponenta symbol");
+  const std::pair<const char*, const char*> cases[] = {
+      {"1.2.3", "wrong fraction symbol"},     {"12a", "wrong fraction symbol"},
+      {"0.05 ", "wrong fraction symbol"},     {"7 ", "wrong fraction symbol"},
+      {"--1", "wrong fraction symbol"},       {"e5", "wrong first symbol"},
+      {" 1", "wrong first symbol"},           {"1e+-2", "wrong exponenta symbol"},
+      {"1e5.", "wrong exponenta symbol"},     {"1ex", "wrong first exponenta symbol"},
+      {"1e ", "wrong first exponenta symbol"}};
+  for (const auto& [text, message] : cases) {
+    EXPECT_EQ(pelmix::testing::ErrorOf([&] { FloatParser::Parse(text); }),
+              std::string("FloatParser: ") + message)
+        << text;
+  }
 }
 
 TEST(FloatParser, FifteenSignificantDigits) {

@@ -8,7 +8,6 @@
 #include "engine/common/error.h"
 #include "engine/kb/packed_file.h"
 #include "tests/support/kb_test_support.h"
-#include "tools/kbtools/container_writer.h"
 
 namespace {
 
@@ -42,20 +41,11 @@ TEST(HostsPathesDB, TokensPairAcrossAnyWhitespace) {
 
 // Through the container: a missing entry fails the load, a single line feed is empty.
 TEST(HostsPathesDB, LoadsFromTheContainer) {
-  pelmix::kbtools::ContainerWriter writer;
-  writer.Add("share_links.txt", "h.com /p\n");
-  auto packed = pelmix::testing::OpenPacked(writer.Build());
+  const auto packed = pelmix::testing::PackedOf({{"share_links.txt", "h.com /p\n"}});
   EXPECT_TRUE(ap::LoadHostsPathesDB(*packed)->contains("h.com", "/p"));
-
-  pelmix::kbtools::ContainerWriter empty;
-  empty.Add("share_links.txt", "");
-  auto without = pelmix::testing::OpenPacked(empty.Build());
-  try {
-    ap::LoadHostsPathesDB(*without);
-    FAIL() << "no error";
-  } catch (const ap::Error& e) {
-    EXPECT_STREQ(e.what(), "null readable for tell");
-  }
+  const auto without = pelmix::testing::PackedOf({{"share_links.txt", ""}});
+  EXPECT_EQ(pelmix::testing::ErrorOf([&] { ap::LoadHostsPathesDB(*without); }),
+            "null readable for tell");
 }
 
 }  // namespace

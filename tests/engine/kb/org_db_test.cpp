@@ -6,6 +6,7 @@
 #include <sstream>
 
 #include "engine/common/error.h"
+#include "tests/support/error_of.h"
 #include "tests/support/kbdb_test_support.h"
 
 namespace {
@@ -64,20 +65,13 @@ TEST(SimpleOrgDB, IdsBeyondTwentyFourBits) {
 }
 
 TEST(SimpleOrgDB, MissingEntry) {
-  try {
-    ap::SimpleOrgDB orgs(std::shared_ptr<ap::ReadableFileI>{});
-    FAIL() << "no error";
-  } catch (const ap::Error& e) {
-    EXPECT_STREQ(e.what(), "Failed to load orgs db - null file");
-  }
+  EXPECT_EQ(
+      pelmix::testing::ErrorOf([&] { ap::SimpleOrgDB orgs(std::shared_ptr<ap::ReadableFileI>{}); }),
+      "Failed to load orgs db - null file");
   std::istringstream failed;
   failed.setstate(std::ios_base::failbit);
-  try {
-    ap::SimpleOrgDB orgs(failed);
-    FAIL() << "no error";
-  } catch (const ap::Error& e) {
-    EXPECT_STREQ(e.what(), "Failed to load orgs db");
-  }
+  EXPECT_EQ(pelmix::testing::ErrorOf([&] { ap::SimpleOrgDB orgs(failed); }),
+            "Failed to load orgs db");
 }
 
 // Damaged text: any prefix and any byte changed load something or nothing, never fail or

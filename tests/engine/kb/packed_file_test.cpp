@@ -27,15 +27,7 @@ std::string Pattern(std::size_t size, unsigned seed) {
   return bytes;
 }
 
-template <class Call>
-std::string ErrorOf(Call&& call) {
-  try {
-    call();
-  } catch (const ap::Error& e) {
-    return e.what();
-  }
-  return "no error";
-}
+using pelmix::testing::ErrorOf;
 
 std::vector<std::pair<std::string, std::uint64_t>> Listing(ap::PackedFile& packed) {
   std::vector<std::pair<std::string, std::uint64_t>> listing;
@@ -264,12 +256,8 @@ TEST(PackedFile, EnumerateVisitsEveryEntryOnce) {
   });
   EXPECT_TRUE(found);
   EXPECT_EQ(calls, 3);
-  try {
-    packed->enumerate({});
-    FAIL() << "an empty callback must raise";
-  } catch (const boost::bad_function_call& e) {
-    EXPECT_STREQ(e.what(), "call to empty boost::function");
-  }
+  EXPECT_EQ(pelmix::testing::ErrorOf<boost::bad_function_call>([&] { packed->enumerate({}); }),
+            "call to empty boost::function");
 }
 
 }  // namespace

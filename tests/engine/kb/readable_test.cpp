@@ -7,19 +7,10 @@
 #include "engine/kb/readable_stream.h"
 #include "engine/kb/readable_wtell.h"
 #include "tests/support/kb_test_support.h"
-#include "tools/kbtools/container_writer.h"
 
 namespace {
 
-template <class Call>
-std::string ErrorOf(Call&& call) {
-  try {
-    call();
-  } catch (const ap::Error& e) {
-    return e.what();
-  }
-  return "no error";
-}
+using pelmix::testing::ErrorOf;
 
 TEST(ReadableBuffer, SeekAndReadOnTenBytes) {
   const char bytes[] = "0123456789";
@@ -57,9 +48,7 @@ TEST(ReadableWTell, TracksThePositionOfTheWrappedFile) {
 }
 
 std::shared_ptr<ap::ReadableFileI> Entry(const std::string& data) {
-  pelmix::kbtools::ContainerWriter writer;
-  writer.Add("entry", data);
-  return pelmix::testing::OpenPacked(writer.Build())->open("entry");
+  return pelmix::testing::PackedOf({{"entry", data}})->open("entry");
 }
 
 std::string Lines(int count) {

@@ -6,6 +6,7 @@
 
 #include "engine/common/error.h"
 #include "engine/kb/white_domains.h"
+#include "tests/support/error_of.h"
 #include "tests/support/kbdb_test_support.h"
 #include "tools/kbtools/wdb_writer.h"
 
@@ -116,21 +117,13 @@ TEST(WhiteDomainsHostile, EntryFaults) {
   auto short_entry = kbdb_test::Entry(std::string(100, 'x'));
   short_entry->short_by = 5;
   for (const auto& entry : {failing, short_entry}) {
-    try {
-      WhiteDomains set(entry);
-      FAIL() << "no error";
-    } catch (const ap::Error& e) {
-      EXPECT_STREQ(e.what(), "WhiteDomains: entry read failed");
-    }
+    EXPECT_EQ(pelmix::testing::ErrorOf([&] { WhiteDomains set(entry); }),
+              "WhiteDomains: entry read failed");
   }
   auto huge = kbdb_test::Entry("x");
   huge->short_by = static_cast<std::int64_t>(wd::kMaxImageSize);
-  try {
-    WhiteDomains set(huge);
-    FAIL() << "no error";
-  } catch (const ap::Error& e) {
-    EXPECT_STREQ(e.what(), "WhiteDomains: entry is too large");
-  }
+  EXPECT_EQ(pelmix::testing::ErrorOf([&] { WhiteDomains set(huge); }),
+            "WhiteDomains: entry is too large");
 }
 
 }  // namespace

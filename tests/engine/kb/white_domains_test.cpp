@@ -11,6 +11,7 @@
 #include "engine/kb/fletcher16.h"
 #include "engine/kb/spooky_hash.h"
 #include "engine/kb/test_white_doms.h"
+#include "tests/support/error_of.h"
 #include "tests/support/kbdb_test_support.h"
 #include "tools/kbtools/wdb_writer.h"
 
@@ -189,18 +190,12 @@ TEST(TestWhiteDoms, CombinesTheSetWithTheOrganisations) {
   EXPECT_FALSE(white.IsCategorised(host.data(), host.data() + 3, host.data(), host.data()));
   EXPECT_FALSE(white.IsShareLink(host.data(), host.data() + 3, host.data(), host.data()));
 
-  try {
-    TestWhiteDoms missing(nullptr, kbdb_test::Entry("1 1\n"));
-    FAIL() << "no error";
-  } catch (const std::runtime_error& e) {
-    EXPECT_STREQ(e.what(), "null pointer to readable in WhiteDomains");
-  }
-  try {
-    TestWhiteDoms missing(kbdb_test::Entry(wdb), nullptr);
-    FAIL() << "no error";
-  } catch (const ap::Error& e) {
-    EXPECT_STREQ(e.what(), "Failed to load orgs db - null file");
-  }
+  EXPECT_EQ(pelmix::testing::ErrorOf<std::runtime_error>(
+                [&] { TestWhiteDoms missing(nullptr, kbdb_test::Entry("1 1\n")); }),
+            "null pointer to readable in WhiteDomains");
+  EXPECT_EQ(
+      pelmix::testing::ErrorOf([&] { TestWhiteDoms missing(kbdb_test::Entry(wdb), nullptr); }),
+      "Failed to load orgs db - null file");
 }
 
 }  // namespace

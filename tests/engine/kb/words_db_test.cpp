@@ -10,7 +10,6 @@
 #include "engine/common/error.h"
 #include "tests/support/kb_test_support.h"
 #include "tests/support/kbdb_test_support.h"
-#include "tools/kbtools/container_writer.h"
 
 namespace {
 
@@ -24,12 +23,7 @@ std::unique_ptr<Db> Load(const std::string& text) {
 }
 
 std::string ErrorOf(const std::string& text) {
-  try {
-    Load(text);
-  } catch (const std::runtime_error& e) {
-    return e.what();
-  }
-  return "no error";
+  return pelmix::testing::ErrorOf<std::runtime_error>([&] { Load(text); });
 }
 
 // "first second third" of a normalised word, or "none".
@@ -193,25 +187,17 @@ TEST(WordsDB, LoadsFromTheContainer) {
   std::string text = "go(1)on 3 3\n";
   for (int i = 0; i < 800; ++i)
     text += "word" + std::to_string(i) + " " + std::to_string(i) + " 2\n";
-  pelmix::kbtools::ContainerWriter writer;
-  writer.Add("lexdb.txt", text);
-  const auto packed = pelmix::testing::OpenPacked(writer.Build());
+  const auto packed = pelmix::testing::PackedOf({{"lexdb.txt", text}});
   Db db;
   lex::LoadWordsDB(*packed, db);
   EXPECT_EQ(db.term_count(), 801u);
   EXPECT_EQ(StatsOf(db, "word799"), "799 2 0");
   EXPECT_EQ(db.phrases().size(), 1u);
 
-  pelmix::kbtools::ContainerWriter none;
-  none.Add("other", "x");
-  const auto without = pelmix::testing::OpenPacked(none.Build());
+  const auto without = pelmix::testing::PackedOf({{"other", "x"}});
   Db empty;
-  try {
-    lex::LoadWordsDB(*without, empty);
-    FAIL() << "no error";
-  } catch (const ap::Error& e) {
-    EXPECT_STREQ(e.what(), "null readable for tell");
-  }
+  EXPECT_EQ(pelmix::testing::ErrorOf([&] { lex::LoadWordsDB(*without, empty); }),
+            "null readable for tell");
 }
 
 // Damaged text loads or fails with the documented error, and every term it keeps resolves.

@@ -9,6 +9,7 @@
 
 #include "engine/common/error.h"
 #include "tests/engine/ml/model_test_files.h"
+#include "tests/support/error_of.h"
 
 namespace ml {
 namespace {
@@ -22,12 +23,7 @@ std::vector<float> Encode(const VectorRules& rules, const std::vector<float>& in
 }
 
 std::string RulesError(const std::string& text) {
-  try {
-    VectorRules rules(MemoryEntry(text));
-  } catch (const std::exception& e) {
-    return e.what();
-  }
-  return "(loaded)";
+  return pelmix::testing::ErrorOf<std::exception>([&] { VectorRules rules(MemoryEntry(text)); });
 }
 
 TEST(SqrtBoost, SharpensAroundOneHalf) {
@@ -96,14 +92,13 @@ TEST(VectorRules, InputMustMatchTheRules) {
 
 TEST(VectorRules, RefusesBadFiles) {
   // The file ends right after its last level; a line end there reads as a missing count.
-  EXPECT_EQ(RulesError("3 1 2 3\n"), "VectorRules: invalid size of rule");
-  EXPECT_EQ(RulesError("0 1"), "VectorRules: invalid size of rule");
-  EXPECT_EQ(RulesError("x 1"), "VectorRules: invalid size of rule");
-  EXPECT_EQ(RulesError(""), "VectorRules: invalid size of rule");
+  for (const char* text : {"3 1 2 3\n", "0 1", "x 1", ""}) {
+    EXPECT_EQ(RulesError(text), "VectorRules: invalid size of rule") << text;
+  }
   // A count promising more levels than the file holds.
-  EXPECT_EQ(RulesError("3 1 2"), "VectorRules: missing level");
-  EXPECT_EQ(RulesError("2 1 5 1"), "VectorRules: missing level");
-  EXPECT_EQ(RulesError("4294967295 1 2"), "VectorRules: missing level");
+  for (const char* text : {"3 1 2", "2 1 5 1", "4294967295 1 2"}) {
+    EXPECT_EQ(RulesError(text), "VectorRules: missing level") << text;
+  }
   // Levels the encoding would divide by zero with, or that never ascend.
   for (const char* text : {"2 0 1", "1 -1", "2 1 1", "3 1 3 2", "1 1e400", "2 -2 -1"}) {
     EXPECT_EQ(RulesError(text), "VectorRules: levels must be finite, above 0 and ascending")

@@ -5,20 +5,16 @@
 #include <string>
 
 #include "engine/ml/json_value.h"
+#include "tests/support/error_of.h"
 
 namespace ml {
 namespace {
 
 std::string ParseError(const std::string& text) {
-  try {
-    ParseJson(text);
-  } catch (const std::runtime_error& e) {
-    return e.what();
-  }
-  return "(accepted)";
+  return pelmix::testing::ErrorOf<std::runtime_error>([&] { ParseJson(text); });
 }
 
-bool Accepts(const std::string& text) { return ParseError(text) == "(accepted)"; }
+bool Accepts(const std::string& text) { return ParseError(text) == "no error"; }
 
 const JsonValue& Only(const JsonValue& array) {
   const auto& items = boost::get<JsonArray>(array);
@@ -31,22 +27,14 @@ std::string StringOf(const std::string& quoted) {
 }
 
 TEST(FlowJson, WhiteSpaceOnlyWhereTheGrammarAllowsIt) {
-  EXPECT_TRUE(Accepts("{}"));
-  EXPECT_TRUE(Accepts("{ }"));
-  EXPECT_TRUE(Accepts("[ \t\n\v\f\r]"));
-  EXPECT_TRUE(Accepts("{ \"a\" \t: \n1 ,\r\n\"b\":2}"));
-  EXPECT_TRUE(Accepts("[ 1 , 2]"));
-
-  EXPECT_FALSE(Accepts("{\"a\":1 }"));
-  EXPECT_FALSE(Accepts("[1 ]"));
-  EXPECT_FALSE(Accepts(" {}"));
-  EXPECT_FALSE(Accepts("{}\n"));
-  EXPECT_FALSE(Accepts("{}{}"));
-  EXPECT_FALSE(Accepts("[1 2]"));
-  EXPECT_FALSE(Accepts("[1,]"));
-  EXPECT_FALSE(Accepts("[,1]"));
-  EXPECT_FALSE(Accepts("{\"a\"}"));
-  EXPECT_FALSE(Accepts("{1:2}"));
+  for (const char* text :
+       {"{}", "{ }", "[ \t\n\v\f\r]", "{ \"a\" \t: \n1 ,\r\n\"b\":2}", "[ 1 , 2]"}) {
+    EXPECT_TRUE(Accepts(text)) << text;
+  }
+  for (const char* text :
+       {"{\"a\":1 }", "[1 ]", " {}", "{}\n", "{}{}", "[1 2]", "[1,]", "[,1]", "{\"a\"}", "{1:2}"}) {
+    EXPECT_FALSE(Accepts(text)) << text;
+  }
 }
 
 TEST(FlowJson, DocumentIsAnObjectOrAnArray) {
@@ -70,17 +58,20 @@ TEST(FlowJson, NeighboursWithoutSeparatorAreTwoEntries) {
 }
 
 TEST(FlowJson, StringEscapes) {
-  EXPECT_EQ(StringOf(R"("a\nb")"), "a\nb");
-  EXPECT_EQ(StringOf(R"("\b\f\n\r\t")"), "\b\f\n\r\t");
-  EXPECT_EQ(StringOf(R"("\"\\\/")"), "\"\\/");
-  EXPECT_EQ(StringOf(R"("\q\u0041")"), "qu0041");  // no \u escape
-  EXPECT_EQ(StringOf(R"("\x41")"), "A");
-  EXPECT_EQ(StringOf(R"("\x141")"), "A");  // low 8 bits of 0x141
-  EXPECT_EQ(StringOf(R"("\x6a\x6A!")"), "jj!");
-  EXPECT_EQ(StringOf(R"("\x")"), "x");  // no digits: the x stands for itself
-  EXPECT_EQ(StringOf(R"("\xg")"), "xg");
-  EXPECT_EQ(StringOf(R"("\x00")"), std::string(1, '\0'));
-  EXPECT_EQ(StringOf("\"line\nend \xff\xfe\""), "line\nend \xff\xfe");  // raw bytes kept
+  const std::pair<std::string, std::string> cases[] = {
+      {R"("a\nb")", "a\nb"},
+      {R"("\b\f\n\r\t")", "\b\f\n\r\t"},
+      {R"("\"\\\/")", "\"\\/"},
+      {R"("\q\u0041")", "qu0041"},  // no \u escape
+      {R"("\x41")", "A"},
+      {R"("\x141")", "A"},  // low 8 bits of 0x141
+      {R"("\x6a\x6A!")", "jj!"},
+      {R"("\x")", "x"},  // no digits: the x stands for itself
+      {R"("\xg")", "xg"},
+      {R"("\x00")", std::string(1, '\0')},
+      {"\"line\nend \xff\xfe\"", "line\nend \xff\xfe"},  // raw bytes kept
+  };
+  for (const auto& [quoted, value] : cases) EXPECT_EQ(StringOf(quoted), value) << quoted;
   EXPECT_FALSE(Accepts(R"(["abc\"])"));
   EXPECT_FALSE(Accepts("[\"abc]"));
 }
@@ -88,13 +79,11 @@ TEST(FlowJson, StringEscapes) {
 TEST(FlowJson, IntegersAreWholeNumbersThatFit32Bits) {
   const auto array = boost::get<JsonArray>(
       ParseJson("[-7,+5,0,007,2147483647,-2147483648,2147483648,-2147483649]"));
+  const std::int64_t whole[] = {-7, 5, 0, 7, 2147483647, -2147483648LL};
   ASSERT_EQ(array.size(), 8u);
-  EXPECT_EQ(boost::get<std::int64_t>(array[0]), -7);
-  EXPECT_EQ(boost::get<std::int64_t>(array[1]), 5);
-  EXPECT_EQ(boost::get<std::int64_t>(array[2]), 0);
-  EXPECT_EQ(boost::get<std::int64_t>(array[3]), 7);
-  EXPECT_EQ(boost::get<std::int64_t>(array[4]), 2147483647);
-  EXPECT_EQ(boost::get<std::int64_t>(array[5]), -2147483648LL);
+  for (std::size_t i = 0; i < std::size(whole); ++i) {
+    EXPECT_EQ(boost::get<std::int64_t>(array[i]), whole[i]) << i;
+  }
   EXPECT_EQ(boost::get<double>(array[6]), 2147483648.0);
   EXPECT_EQ(boost::get<double>(array[7]), -2147483649.0);
 }
@@ -185,22 +174,14 @@ TEST(FlowJson, ComposerRefusesEventsTheGrammarCannotSend) {
   Composer ended;
   ended.ArrayStart();
   ended.ContainerEnd();
-  try {
-    ended.Integer(1);
-    FAIL();
-  } catch (const std::runtime_error& e) {
-    EXPECT_STREQ(e.what(), "json parsing error, trying to set value on empty stack");
-  }
+  EXPECT_EQ(pelmix::testing::ErrorOf<std::runtime_error>([&] { ended.Integer(1); }),
+            "json parsing error, trying to set value on empty stack");
   EXPECT_THROW(ended.ContainerEnd(), std::runtime_error);
 
   Composer object;
   object.ObjectStart();
-  try {
-    object.Double(1.5);
-    FAIL();
-  } catch (const std::runtime_error& e) {
-    EXPECT_STREQ(e.what(), "json parse error, only string supported to append into hash");
-  }
+  EXPECT_EQ(pelmix::testing::ErrorOf<std::runtime_error>([&] { object.Double(1.5); }),
+            "json parse error, only string supported to append into hash");
 }
 
 TEST(FlowJson, WrongKindIsBadGet) {

@@ -8,6 +8,7 @@
 
 #include "engine/common/error.h"
 #include "tests/engine/ml/model_test_files.h"
+#include "tests/support/error_of.h"
 
 namespace ml {
 namespace {
@@ -22,12 +23,7 @@ SimplePerceptron LoadNetwork(const std::string& text, int piece = 0) {
 }
 
 std::string LoadError(const std::string& text) {
-  try {
-    LoadNetwork(text);
-  } catch (const ap::Error& e) {
-    return e.what();
-  }
-  return "(loaded)";
+  return pelmix::testing::ErrorOf([&] { LoadNetwork(text); });
 }
 
 std::vector<float> Forward(const SimplePerceptron& network, const std::vector<float>& input) {

@@ -1,56 +1,25 @@
 // The dump commands, run as the built CLI on files and on stdin.
 #include <gtest/gtest.h>
-#include <sys/wait.h>
-#include <unistd.h>
 
-#include <cstdio>
-#include <filesystem>
-#include <fstream>
-#include <string>
+#include "tests/tools/pelmix/cli_runner.h"
 
 namespace {
 
-struct Outcome {
-  int exitCode = -1;
-  std::string out;
-};
+using pelmix::testing::CliRun;
+using pelmix::testing::RunCli;
 
-Outcome RunCli(const std::string& arguments) {
-  const std::string command = std::string(PELMIX_CLI_PATH) + " " + arguments + " 2>/dev/null";
-  Outcome outcome;
-  std::FILE* pipe = popen(command.c_str(), "r");
-  if (pipe == nullptr) return outcome;
-  char buffer[4096];
-  std::size_t n;
-  while ((n = std::fread(buffer, 1, sizeof buffer, pipe)) > 0) outcome.out.append(buffer, n);
-  const int status = pclose(pipe);
-  outcome.exitCode = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
-  return outcome;
-}
-
-class DumpCommands : public testing::Test {
+class DumpCommands : public pelmix::testing::CliTest {
  protected:
-  void SetUp() override {
-    dir_ =
-        std::filesystem::temp_directory_path() / ("pelmix-dump-test-" + std::to_string(getpid()));
-    std::filesystem::create_directories(dir_);
-  }
-  void TearDown() override { std::filesystem::remove_all(dir_); }
-
   std::string File(const std::string& name, const std::string& content) {
-    const std::filesystem::path path = dir_ / name;
-    std::ofstream(path, std::ios::binary) << content;
-    return path.string();
+    return Write(name, content);
   }
-
-  std::filesystem::path dir_;
 };
 
 TEST_F(DumpCommands, TokensOnAFileWithEveryEventKind) {
   const std::string page = "x<P Class=\"a\\\"b\">\xE9<!-- c --><script>s(1)</script><br/></p><";
   const std::string path = File("page.html", page);
-  const Outcome outcome = RunCli("dump tokens " + path);
-  EXPECT_EQ(outcome.exitCode, 0);
+  const CliRun outcome = RunCli("dump tokens " + path);
+  EXPECT_EQ(outcome.status, 0);
   EXPECT_EQ(outcome.out,
             "{\"ev\":\"text\",\"data\":\"x\"}\n"
             "{\"ev\":\"open\",\"name\":\"p\"}\n"
@@ -92,11 +61,11 @@ TEST_F(DumpCommands, StringsJsonDataUrlAndEntity) {
 }
 
 TEST_F(DumpCommands, BadArgumentsAndInputs) {
-  EXPECT_EQ(RunCli("dump tokens").exitCode, 64);
-  EXPECT_EQ(RunCli("dump tokens a b").exitCode, 64);
-  EXPECT_EQ(RunCli("dump json --chunk 0 -").exitCode, 64);
-  EXPECT_EQ(RunCli("dump entity").exitCode, 64);
-  EXPECT_EQ(RunCli("dump strings " + (dir_ / "missing.js").string()).exitCode, 1);
+  for (const char* bad :
+       {"dump tokens", "dump tokens a b", "dump json --chunk 0 -", "dump entity"}) {
+    EXPECT_EQ(RunCli(bad).status, 64) << bad;
+  }
+  EXPECT_EQ(RunCli("dump strings " + Path("missing.js")).status, 1);
 }
 
 }  // namespace

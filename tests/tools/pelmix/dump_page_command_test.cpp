@@ -1,11 +1,6 @@
 // pelmix dump page: every call the decrunch pipeline makes on its receiver and on the sinks
 // the receiver hands out, whatever the chunk size.
 #include <gtest/gtest.h>
-#include <unistd.h>
-
-#include <filesystem>
-#include <fstream>
-#include <string>
 
 #include "tests/tools/pelmix/cli_runner.h"
 
@@ -13,20 +8,9 @@ namespace {
 
 using pelmix::testing::RunCli;
 
-class DumpPageCommand : public testing::Test {
+class DumpPageCommand : public pelmix::testing::CliTest {
  protected:
-  void SetUp() override {
-    path_ = std::filesystem::temp_directory_path() /
-            ("pelmix-dump-page-" + std::to_string(getpid()) + ".html");
-  }
-  void TearDown() override { std::filesystem::remove(path_); }
-
-  std::string File(const std::string& content) {
-    std::ofstream(path_, std::ios::binary) << content;
-    return path_.string();
-  }
-
-  std::filesystem::path path_;
+  std::string File(const std::string& content) { return Write("page.html", content); }
 };
 
 TEST_F(DumpPageCommand, EveryKindOfEventWhateverTheChunkSize) {
@@ -76,7 +60,7 @@ TEST_F(DumpPageCommand, JsonVerdictAndBadArguments) {
   EXPECT_EQ(RunCli("dump page " + File(" {\"a\": \"<b>x</b>\"} ")).out,
             "{\"ev\":\"json\",\"accepted\":true}\n");
   EXPECT_EQ(RunCli("dump page").status, 64);
-  EXPECT_EQ(RunCli("dump page --chunk 0 " + path_.string()).status, 64);
+  EXPECT_EQ(RunCli("dump page --chunk 0 " + Path("page.html")).status, 64);
   EXPECT_EQ(RunCli("dump page /nonexistent/page.html").status, 1);
 }
 

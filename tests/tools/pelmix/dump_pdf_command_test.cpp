@@ -1,29 +1,15 @@
 #include <gtest/gtest.h>
-#include <sys/wait.h>
 
 #include <cstdio>
 #include <fstream>
 
 #include "tests/engine/pdf/pdf_test_support.h"
+#include "tests/tools/pelmix/cli_runner.h"
 
 namespace {
 
-struct CliRun {
-  int status = -1;
-  std::string out;
-};
-
-CliRun RunCli(const std::string& arguments) {
-  CliRun run;
-  std::FILE* pipe = popen((std::string(PELMIX_CLI_PATH) + " " + arguments).c_str(), "r");
-  if (pipe == nullptr) return run;
-  char buffer[4096];
-  for (std::size_t n; (n = std::fread(buffer, 1, sizeof buffer, pipe)) > 0;)
-    run.out.append(buffer, n);
-  const int status = pclose(pipe);
-  run.status = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
-  return run;
-}
+using pelmix::testing::CliRun;
+using pelmix::testing::RunCli;
 
 TEST(DumpPdfCommand, TextLinksAndRawEvents) {
   const std::string path = testing::TempDir() + "dump_pdf_command_test.pdf";
@@ -54,7 +40,7 @@ TEST(DumpPdfCommand, TextLinksAndRawEvents) {
                 "{\"ev\":\"object_end\"}\n{\"ev\":\"object\",\"num\":5,\"gen\":0}\n"
                 "{\"ev\":\"link\",\"data\":\"http://dict.example/\"}\n"
                 "{\"ev\":\"object_end\"}\n");
-  EXPECT_EQ(RunCli("dump pdf --bogus " + path + " 2>/dev/null").status, 64);
+  EXPECT_EQ(RunCli("dump pdf --bogus " + path).status, 64);
   EXPECT_EQ(RunCli("dump pdf /nonexistent/x.pdf 2>/dev/null").status, 1);
   std::remove(path.c_str());
 }

@@ -1,77 +1,34 @@
 // `pelmix kb build` and `pelmix kb query`, run as a maintainer runs them, on the example
 // knowledge base and on sources written for the test.
 #include <gtest/gtest.h>
-#include <sys/wait.h>
-#include <unistd.h>
 
-#include <cstdio>
-#include <filesystem>
-#include <fstream>
-#include <sstream>
+#include "tests/tools/pelmix/cli_runner.h"
 
 namespace {
 
 namespace fs = std::filesystem;
+using pelmix::testing::CliRun;
+using pelmix::testing::RunCli;
 
-class KbBuildQuery : public ::testing::Test {
+class KbBuildQuery : public pelmix::testing::CliTest {
  protected:
-  struct Result {
-    int status = -1;
-    std::string out;
-    std::string err;
-  };
-
-  void SetUp() override {
-    char pattern[] = "/tmp/pelmix-kbdb-XXXXXX";
-    ASSERT_NE(::mkdtemp(pattern), nullptr);
-    dir_ = pattern;
-  }
-  void TearDown() override { fs::remove_all(dir_); }
-
-  std::string Path(const std::string& name) const { return (dir_ / name).string(); }
-
-  void Write(const std::string& name, const std::string& bytes) const {
-    fs::create_directories(fs::path(Path(name)).parent_path());
-    std::ofstream(Path(name), std::ios::binary) << bytes;
-  }
-
-  Result Run(const std::string& args) const {
-    const std::string err = Path("stderr.txt");
-    const std::string command = std::string(PELMIX_CLI_PATH) + " " + args + " 2>" + err;
-    Result result;
-    FILE* pipe = ::popen(command.c_str(), "r");
-    if (pipe == nullptr) return result;
-    char buffer[4096];
-    std::size_t n;
-    while ((n = std::fread(buffer, 1, sizeof buffer, pipe)) > 0) result.out.append(buffer, n);
-    const int status = ::pclose(pipe);
-    result.status = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
-    std::ifstream in(err);
-    std::ostringstream text;
-    text << in.rdbuf();
-    result.err = text.str();
-    return result;
-  }
-
   // Builds `source` into out.kb; the build must succeed.
   std::string Build(const std::string& source) const {
-    const Result build = Run("kb build " + source + " " + Path("out.kb"));
+    const CliRun build = RunCli("kb build " + source + " " + Path("out.kb"));
     EXPECT_EQ(build.status, 0) << build.err;
     return Path("out.kb");
   }
 
   std::string Query(const std::string& kb, const std::string& question) const {
-    const Result query = Run("kb query " + kb + " " + question);
+    const CliRun query = RunCli("kb query " + kb + " " + question);
     EXPECT_EQ(query.status, 0) << question << ": " << query.err;
     return query.out;
   }
-
-  fs::path dir_;
 };
 
 TEST_F(KbBuildQuery, ExampleKnowledgeBase) {
   const std::string kb = Build(std::string(PELMIX_SOURCE_DIR) + "/examples/kb");
-  const std::string list = Run("kb list " + kb).out;
+  const std::string list = RunCli("kb list " + kb).out;
   for (const char* entry :
        {"lexdb.txt\t", "orgs\t", "sb.db\t", "share_links.txt\t", "v3.cfg\t", "wdb\t"}) {
     EXPECT_NE(list.find(entry), std::string::npos) << entry;
@@ -111,10 +68,10 @@ TEST_F(KbBuildQuery, EmptyBasesLoadEmpty) {
   Write("src/share_links.txt", "");
   Write("src/models/web.flow", "{}");
   const std::string kb = Path("src/out.kb");
-  ASSERT_EQ(Run("kb build " + Path("src") + " " + kb).status, 0);
-  const Result again = Run("kb build " + Path("src") + " " + kb);
+  ASSERT_EQ(RunCli("kb build " + Path("src") + " " + kb).status, 0);
+  const CliRun again = RunCli("kb build " + Path("src") + " " + kb);
   ASSERT_EQ(again.status, 0) << again.err;
-  EXPECT_EQ(Run("kb list " + kb).out,
+  EXPECT_EQ(RunCli("kb list " + kb).out,
             "lexdb.txt\t1\nmodels/web.flow\t2\norgs\t1\nsb.db\t0\nshare_links.txt\t1\nwdb\t1\n");
   EXPECT_EQ(Query(kb, "white a.com"), "key=0 partial=0 other_suffix=0 white=0 category=6\n");
   EXPECT_EQ(Query(kb, "org 1"), "found=0 category=6\n");
@@ -124,46 +81,47 @@ TEST_F(KbBuildQuery, EmptyBasesLoadEmpty) {
 }
 
 TEST_F(KbBuildQuery, BuildErrorsNameFileAndLine) {
-  Write("a/white_domains.txt", "1 good.com\n\n7 bad_domain.com\n");
-  Result r = Run("kb build " + Path("a") + " " + Path("a.kb"));
-  EXPECT_EQ(r.status, 1);
-  EXPECT_EQ(r.err, "pelmix: kb build: " + Path("a/white_domains.txt") +
-                       ":3: domain bad_domain.com has a character outside a-z 0-9 - .\n");
-  EXPECT_FALSE(fs::exists(Path("a.kb")));
-
-  Write("b/categorised_hosts.txt", "x.com/p 1\n");
-  r = Run("kb build " + Path("b") + " " + Path("b.kb"));
-  EXPECT_EQ(r.err, "pelmix: kb build: " + Path("b/categorised_hosts.txt") +
-                       ":1: path for host x.com, which no earlier line names\n");
-
-  Write("c/lexdb.txt", "word 1 1\nnoblank\n");
-  r = Run("kb build " + Path("c") + " " + Path("c.kb"));
-  EXPECT_EQ(r.err,
-            "pelmix: kb build: " + Path("c/lexdb.txt") + ": invalid lexdb string 'noblank'\n");
+  struct Case {
+    std::string file, text, message;
+  };
+  const Case cases[] = {
+      {"a/white_domains.txt", "1 good.com\n\n7 bad_domain.com\n",
+       ":3: domain bad_domain.com has a character outside a-z 0-9 - .\n"},
+      {"b/categorised_hosts.txt", "x.com/p 1\n",
+       ":1: path for host x.com, which no earlier line names\n"},
+      {"c/lexdb.txt", "word 1 1\nnoblank\n", ": invalid lexdb string 'noblank'\n"},
+  };
+  for (const Case& c : cases) {
+    const std::string file = Write(c.file, c.text);
+    const std::string source = fs::path(file).parent_path().string();
+    const CliRun r = RunCli("kb build " + source + " " + source + ".kb");
+    EXPECT_EQ(r.status, 1) << c.file;
+    EXPECT_EQ(r.err, "pelmix: kb build: " + file + c.message);
+    EXPECT_FALSE(fs::exists(source + ".kb"));
+  }
 
   Write("d/white_domains.txt", "1 a.com\n");
   Write("d/wdb", "x");
-  r = Run("kb build " + Path("d") + " " + Path("d.kb"));
+  const CliRun r = RunCli("kb build " + Path("d") + " " + Path("d.kb"));
   EXPECT_EQ(r.status, 1);
   EXPECT_NE(r.err.find("entry wdb is given twice"), std::string::npos) << r.err;
 
-  EXPECT_EQ(Run("kb build " + Path("missing") + " " + Path("e.kb")).status, 1);
-  EXPECT_EQ(Run("kb build " + Path("a")).status, 64);
+  EXPECT_EQ(RunCli("kb build " + Path("missing") + " " + Path("e.kb")).status, 1);
+  EXPECT_EQ(RunCli("kb build " + Path("a")).status, 64);
 }
 
 TEST_F(KbBuildQuery, QueryFailures) {
   Write("src/orgs", "1 1\nOne\n");
   const std::string kb = Build(Path("src"));
   // No "wdb": the white-domain object cannot be built, as the engine's load would fail.
-  Result r = Run("kb query " + kb + " white a.com");
+  CliRun r = RunCli("kb query " + kb + " white a.com");
   EXPECT_EQ(r.status, 1);
   EXPECT_EQ(r.err, "pelmix: kb query: null pointer to readable in WhiteDomains\n");
-  r = Run("kb query " + kb + " sharelink a.com /");
+  r = RunCli("kb query " + kb + " sharelink a.com /");
   EXPECT_EQ(r.err, "pelmix: kb query: null readable for tell\n");
-  EXPECT_EQ(Run("kb query " + kb + " colour a").status, 64);
-  EXPECT_EQ(Run("kb query " + kb + " org").status, 64);
-  EXPECT_EQ(Run("kb query " + kb + " org x1").status, 64);
-  EXPECT_EQ(Run("kb query " + kb + " categorised a.com").status, 64);
+  for (const char* bad : {"colour a", "org", "org x1", "categorised a.com"}) {
+    EXPECT_EQ(RunCli("kb query " + kb + " " + bad).status, 64) << bad;
+  }
 }
 
 }  // namespace

@@ -1,66 +1,14 @@
 // The `pelmix kb` tools, run as a maintainer would run them.
 #include <gtest/gtest.h>
-#include <sys/wait.h>
-#include <unistd.h>
-
-#include <cstdio>
-#include <filesystem>
-#include <fstream>
-#include <sstream>
 
 #include "tests/support/kb_test_support.h"
+#include "tests/tools/pelmix/cli_runner.h"
 
 namespace {
 
-namespace fs = std::filesystem;
-
-struct Result {
-  int status = -1;
-  std::string out;
-  std::string err;
-};
-
-class KbCommands : public ::testing::Test {
- protected:
-  void SetUp() override {
-    char pattern[] = "/tmp/pelmix-kb-XXXXXX";
-    ASSERT_NE(::mkdtemp(pattern), nullptr);
-    dir_ = pattern;
-  }
-  void TearDown() override { fs::remove_all(dir_); }
-
-  std::string Path(const std::string& name) const { return (dir_ / name).string(); }
-
-  void Write(const std::string& name, const std::string& bytes) const {
-    fs::create_directories(fs::path(Path(name)).parent_path());
-    std::ofstream(Path(name), std::ios::binary) << bytes;
-  }
-
-  std::string Slurp(const std::string& name) const {
-    std::ifstream in(Path(name), std::ios::binary);
-    std::ostringstream bytes;
-    bytes << in.rdbuf();
-    return bytes.str();
-  }
-
-  // Runs `pelmix ARGS` with stdout and stderr captured apart.
-  Result Run(const std::string& args) const {
-    const std::string err = Path("stderr.txt");
-    const std::string command = std::string(PELMIX_CLI_PATH) + " " + args + " 2>" + err;
-    Result result;
-    FILE* pipe = ::popen(command.c_str(), "r");
-    if (pipe == nullptr) return result;
-    char buffer[4096];
-    std::size_t n;
-    while ((n = std::fread(buffer, 1, sizeof buffer, pipe)) > 0) result.out.append(buffer, n);
-    const int status = ::pclose(pipe);
-    result.status = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
-    result.err = Slurp("stderr.txt");
-    return result;
-  }
-
-  fs::path dir_;
-};
+using pelmix::testing::CliRun;
+using pelmix::testing::RunCli;
+using KbCommands = pelmix::testing::CliTest;
 
 TEST_F(KbCommands, PackListCatVerifyAndConfigOfADirectory) {
   const std::string big(70000, 'b');
@@ -69,27 +17,25 @@ TEST_F(KbCommands, PackListCatVerifyAndConfigOfADirectory) {
   Write("kb/models/web.flow", "{}");
   Write("kb/big", big);
   Write("kb/empty", "");
+  const std::string kb = Path("out.kb");
 
-  const Result pack = Run("kb pack " + Path("out.kb") + " " + Path("kb"));
+  const CliRun pack = RunCli("kb pack " + kb + " " + Path("kb"));
   ASSERT_EQ(pack.status, 0) << pack.err;
-
-  const Result list = Run("kb list " + Path("out.kb"));
+  const CliRun list = RunCli("kb list " + kb);
   EXPECT_EQ(list.status, 0);
   EXPECT_EQ(list.out, "big\t70000\nempty\t0\nmodels/web.flow\t2\nv3.cfg\t" +
                           std::to_string(cfg.size()) + "\n");
-
-  EXPECT_EQ(Run("kb verify " + Path("out.kb")).out, "ok 4\n");
-  EXPECT_EQ(Run("kb cat " + Path("out.kb") + " big").out, big);
-  EXPECT_EQ(Run("kb cat " + Path("out.kb") + " models/web.flow").out, "{}");
-  const Result empty = Run("kb cat " + Path("out.kb") + " empty");
+  EXPECT_EQ(RunCli("kb verify " + kb).out, "ok 4\n");
+  EXPECT_EQ(RunCli("kb cat " + kb + " big").out, big);
+  const CliRun empty = RunCli("kb cat " + kb + " empty");
   EXPECT_EQ(empty.status, 0);
   EXPECT_EQ(empty.out, "");
-  const Result missing = Run("kb cat " + Path("out.kb") + " Big");
+  const CliRun missing = RunCli("kb cat " + kb + " Big");
   EXPECT_EQ(missing.status, 1);
   EXPECT_EQ(missing.out, "");
   EXPECT_NE(missing.err.find("no entry Big"), std::string::npos) << missing.err;
 
-  const Result config = Run("kb config " + Path("out.kb"));
+  const CliRun config = RunCli("kb config " + kb);
   EXPECT_EQ(config.status, 0) << config.err;
   EXPECT_EQ(config.out,
             "dbstamp=77\n"
@@ -100,70 +46,66 @@ TEST_F(KbCommands, PackListCatVerifyAndConfigOfADirectory) {
 }
 
 TEST_F(KbCommands, PackNamedFilesAndRefuseBadArguments) {
-  Write("a.txt", "alpha");
-  Write("b.txt", "beta");
-  const Result pack = Run("kb pack " + Path("named.kb") + " first=" + Path("a.txt") +
-                          " 'with space'=" + Path("b.txt"));
+  const std::string a = Write("a.txt", "alpha");
+  const std::string b = Write("b.txt", "beta");
+  const CliRun pack = RunCli("kb pack " + Path("named.kb") + " first=" + a + " 'with space'=" + b);
   ASSERT_EQ(pack.status, 0) << pack.err;
-  EXPECT_EQ(Run("kb list " + Path("named.kb")).out, "first\t5\nwith space\t4\n");
-  EXPECT_EQ(Run("kb cat " + Path("named.kb") + " 'with space'").out, "beta");
+  EXPECT_EQ(RunCli("kb list " + Path("named.kb")).out, "first\t5\nwith space\t4\n");
+  EXPECT_EQ(RunCli("kb cat " + Path("named.kb") + " 'with space'").out, "beta");
 
-  EXPECT_EQ(Run("kb pack " + Path("x.kb") + " a=" + Path("a.txt") + " a=" + Path("b.txt")).status,
-            1);
-  EXPECT_EQ(Run("kb pack " + Path("x.kb") + " a=" + Path("nothing.txt")).status, 1);
-  EXPECT_EQ(Run("kb pack " + Path("x.kb") + " " + Path("a.txt")).status, 64);
-  EXPECT_EQ(Run("kb pack " + Path("x.kb")).status, 64);
-  EXPECT_EQ(Run("kb list").status, 64);
+  const std::pair<std::string, int> refused[] = {
+      {" a=" + a + " a=" + b, 1}, {" a=" + Path("nothing.txt"), 1}, {" " + a, 64}, {"", 64}};
+  for (const auto& [sources, status] : refused) {
+    EXPECT_EQ(RunCli("kb pack " + Path("x.kb") + sources).status, status) << sources;
+  }
+  EXPECT_EQ(RunCli("kb list").status, 64);
 }
 
 TEST_F(KbCommands, VerifyReportsTheEnginesMessage) {
-  Write("a", "first entry");
-  Write("b", "second entry");
-  ASSERT_EQ(Run("kb pack " + Path("good.kb") + " a=" + Path("a") + " b=" + Path("b")).status, 0);
+  ASSERT_EQ(RunCli("kb pack " + Path("good.kb") + " a=" + Write("a", "first entry") +
+                   " b=" + Write("b", "second entry"))
+                .status,
+            0);
   const std::string good = Slurp("good.kb");
 
   std::string body = good;
   body.back() ^= 1;
-  Write("body.kb", body);
-  Result verify = Run("kb verify " + Path("body.kb"));
+  CliRun verify = RunCli("kb verify " + Write("body.kb", body));
   EXPECT_EQ(verify.status, 1);
   EXPECT_EQ(verify.out, "Control summ is invalid\n");
-  EXPECT_EQ(Run("kb list " + Path("body.kb")).status, 1);
+  EXPECT_EQ(RunCli("kb list " + Path("body.kb")).status, 1);
 
   std::string entry = good;
   entry.back() ^= 1;  // the last byte of "b"
   pelmix::testing::Reseal(entry);
-  Write("entry.kb", entry);
-  verify = Run("kb verify " + Path("entry.kb"));
+  verify = RunCli("kb verify " + Write("entry.kb", entry));
   EXPECT_EQ(verify.status, 1);
   EXPECT_EQ(verify.out, "b: Failed to create ReadableFile crc error\n");
-  EXPECT_EQ(Run("kb list " + Path("entry.kb")).status, 0) << "listing does not open entries";
-  EXPECT_EQ(Run("kb cat " + Path("entry.kb") + " a").out, "first entry");
-  EXPECT_EQ(Run("kb cat " + Path("entry.kb") + " b").status, 1);
+  EXPECT_EQ(RunCli("kb list " + Path("entry.kb")).status, 0) << "listing does not open entries";
+  EXPECT_EQ(RunCli("kb cat " + Path("entry.kb") + " a").out, "first entry");
+  EXPECT_EQ(RunCli("kb cat " + Path("entry.kb") + " b").status, 1);
 
-  verify = Run("kb verify " + Path("absent.kb"));
+  verify = RunCli("kb verify " + Path("absent.kb"));
   EXPECT_EQ(verify.status, 1);
   EXPECT_NE(verify.out.find("absent.kb"), std::string::npos) << verify.out;
 
-  Write("short.kb", good.substr(0, 20));
-  verify = Run("kb verify " + Path("short.kb"));
+  verify = RunCli("kb verify " + Write("short.kb", good.substr(0, 20)));
   EXPECT_EQ(verify.status, 1);
   EXPECT_EQ(verify.out.rfind("CheckFailedException at antiphishing_io_adapter.cpp:", 0), 0u)
       << verify.out;
 }
 
 TEST_F(KbCommands, ConfigFailures) {
-  Write("cfg", "dbstamp=1;\nweb_threshold=0.05 ;\n");
-  ASSERT_EQ(Run("kb pack " + Path("bad.kb") + " v3.cfg=" + Path("cfg")).status, 0);
-  Result config = Run("kb config " + Path("bad.kb"));
-  EXPECT_EQ(config.status, 1);
-  EXPECT_EQ(config.out, "");
-  EXPECT_NE(config.err.find("FloatParser: wrong fraction symbol"), std::string::npos) << config.err;
-
-  ASSERT_EQ(Run("kb pack " + Path("none.kb") + " other=" + Path("cfg")).status, 0);
-  config = Run("kb config " + Path("none.kb"));
-  EXPECT_EQ(config.status, 1);
-  EXPECT_NE(config.err.find("v3.cfg not found"), std::string::npos) << config.err;
+  const std::string cfg = Write("cfg", "dbstamp=1;\nweb_threshold=0.05 ;\n");
+  const std::pair<std::string, std::string> cases[] = {
+      {"v3.cfg", "FloatParser: wrong fraction symbol"}, {"other", "v3.cfg not found"}};
+  for (const auto& [entry, message] : cases) {
+    ASSERT_EQ(RunCli("kb pack " + Path("bad.kb") + " " + entry + "=" + cfg).status, 0);
+    const CliRun config = RunCli("kb config " + Path("bad.kb"));
+    EXPECT_EQ(config.status, 1);
+    EXPECT_EQ(config.out, "");
+    EXPECT_NE(config.err.find(message), std::string::npos) << config.err;
+  }
 }
 
 }  // namespace

@@ -1,10 +1,7 @@
 // pelmix model run, on a model in a directory and the same model packed in a container.
 #include <gtest/gtest.h>
-#include <unistd.h>
 
 #include <algorithm>
-#include <filesystem>
-#include <fstream>
 #include <map>
 #include <sstream>
 #include <string>
@@ -17,7 +14,6 @@
 
 namespace {
 
-namespace fs = std::filesystem;
 using pelmix::testing::CliRun;
 using pelmix::testing::RunCli;
 
@@ -32,36 +28,24 @@ const std::map<std::string, std::string> kModel = {
      R"({"convs":{"s":{"type":"sqrtboost"}},"flow":[{"name":"a","input":[[0,2]],"conv":"s"}]})"},
 };
 
-class ModelRun : public ::testing::Test {
+class ModelRun : public pelmix::testing::CliTest {
  protected:
   void SetUp() override {
-    dir_ = fs::temp_directory_path() /
-           ("pelmix_model_run_" + std::to_string(getpid()) + "_" +
-            ::testing::UnitTest::GetInstance()->current_test_info()->name());
-    fs::remove_all(dir_);
+    CliTest::SetUp();
     pelmix::kbtools::ContainerWriter writer;
     for (const auto& [name, bytes] : kModel) {
-      Write(dir_ / "model" / name, bytes);
+      Write("model/" + name, bytes);
       writer.Add(name, bytes);
     }
-    Write(dir_ / "model.kb", writer.Build());
-  }
-  void TearDown() override { fs::remove_all(dir_); }
-
-  static void Write(const fs::path& path, const std::string& bytes) {
-    fs::create_directories(path.parent_path());
-    std::ofstream(path, std::ios::binary) << bytes;
+    Write("model.kb", writer.Build());
   }
 
   CliRun Run(const std::string& args, const std::string& input, bool withStderr = false) {
-    Write(dir_ / "input.txt", input);
-    return RunCli("model run " + args + " < " + (dir_ / "input.txt").string(), withStderr);
+    return RunCli("model run " + args + " < " + Write("input.txt", input), withStderr);
   }
 
-  std::string Dir() const { return "--dir " + (dir_ / "model").string(); }
-  std::string Kb() const { return "--kb " + (dir_ / "model.kb").string(); }
-
-  fs::path dir_;
+  std::string Dir() const { return "--dir " + Path("model"); }
+  std::string Kb() const { return "--kb " + Path("model.kb"); }
 };
 
 TEST_F(ModelRun, PrintsOutputsAndDecision) {
@@ -130,13 +114,13 @@ TEST_F(ModelRun, ConstructionErrorsStopTheRun) {
   CliRun run = Run(Dir() + " mail.flow", "1\n", true);
   EXPECT_EQ(run.status, 1);
   EXPECT_EQ(run.out, "pelmix: model run: Absent flow file mail.flow\n");
-  Write(dir_ / "model" / "bad.flow", R"({"convs":{},"flow":[{"name":"a"}]})");
+  Write("model/bad.flow", R"({"convs":{},"flow":[{"name":"a"}]})");
   run = Run(Dir() + " bad.flow", "1\n", true);
   EXPECT_EQ(run.status, 1);
   EXPECT_EQ(run.out,
             "pelmix: model run: Deep solver config error: Wrong number of parameters in flow\n");
   // Sources outside the directory are not reachable.
-  Write(dir_ / "model" / "escape.flow",
+  Write("model/escape.flow",
         R"({"convs":{"r":{"type":"rules","src":"../model/r.rules"}},"flow":[]})");
   run = Run(Dir() + " escape.flow", "", true);
   EXPECT_EQ(run.out,
@@ -145,13 +129,12 @@ TEST_F(ModelRun, ConstructionErrorsStopTheRun) {
 }
 
 TEST_F(ModelRun, BadCommandLines) {
-  EXPECT_EQ(Run("web.flow", "").status, 64);
-  EXPECT_EQ(Run(Dir() + " " + Kb() + " web.flow", "").status, 64);
-  EXPECT_EQ(Run(Dir(), "").status, 64);
-  EXPECT_EQ(Run(Dir() + " web.flow --threshold", "").status, 64);
-  EXPECT_EQ(Run(Dir() + " web.flow --threshold abc", "").status, 64);
-  EXPECT_EQ(Run(Dir() + " web.flow --frob", "").status, 64);
-  EXPECT_EQ(Run(Dir() + " web.flow boost.flow", "").status, 64);
+  for (const std::string& args :
+       {std::string("web.flow"), Dir() + " " + Kb() + " web.flow", Dir(),
+        Dir() + " web.flow --threshold", Dir() + " web.flow --threshold abc",
+        Dir() + " web.flow --frob", Dir() + " web.flow boost.flow"}) {
+    EXPECT_EQ(Run(args, "").status, 64) << args;
+  }
   EXPECT_EQ(Run("--kb /nonexistent.kb web.flow", "").status, 1);
 }
 
