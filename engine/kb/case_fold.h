@@ -11,6 +11,8 @@
 #include <string>
 #include <string_view>
 
+#include "framework/uvo/text.h"
+
 namespace lex {
 
 // The folded code point, or nothing when `cp` lies outside the folded ranges.
@@ -18,7 +20,7 @@ std::optional<char32_t> FoldCodePoint(char32_t cp);
 
 // Appends the UTF-8 form of `cp` (at most U+10FFFF is expected; higher values are written
 // with the four-byte pattern, keeping their low 21 bits).
-void AppendUtf8(std::string& out, char32_t cp);
+using uvo::AppendUtf8;
 
 // The normalisation of one lexeme-database line: ASCII capitals are lower-cased; a byte of
 // 0xC0-0xF7 opens a sequence of 2 to 4 bytes whose next bytes are taken as its continuation
