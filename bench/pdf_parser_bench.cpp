@@ -9,17 +9,9 @@
 #include "engine/pdf/memory_file.h"
 #include "engine/pdf/parser.h"
 #include "engine/pdf/scan.h"
+#include "tests/engine/pdf/pdf_test_support.h"
 
 namespace {
-
-std::string Deflate(const std::string& data) {
-  uLongf size = compressBound(data.size());
-  std::string out(size, '\0');
-  compress(reinterpret_cast<Bytef*>(out.data()), &size, reinterpret_cast<const Bytef*>(data.data()),
-           data.size());
-  out.resize(size);
-  return out;
-}
 
 std::string Object(int number, const std::string& body) {
   return std::to_string(number) + " 0 obj\r\n" + body + "\r\nendobj\r\n";
@@ -55,9 +47,9 @@ const std::string& LargePdf() {
       doc +=
           Object(number++, "<< /Type /Page /Parent 2 0 R /Contents " + std::to_string(first + 1) +
                                " 0 R /Annots [" + std::to_string(first + 4) + " 0 R] >>");
-      doc += Stream(number++, "/Filter /FlateDecode", Deflate(content));
+      doc += Stream(number++, "/Filter /FlateDecode", pdf_test::Deflate(content));
       doc += Stream(number++, "/Type /XObject /Subtype /Image /Width 128 /Height 320", image);
-      doc += Stream(number++, "/Filter /FlateDecode", Deflate(font));
+      doc += Stream(number++, "/Filter /FlateDecode", pdf_test::Deflate(font));
       doc += Object(number++, "<< /Type /Annot /Subtype /Link /A << /S /URI /URI (http://p" +
                                   std::to_string(page) + ".example/login) >> >>");
     }
