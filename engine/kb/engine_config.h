@@ -23,8 +23,8 @@
 
 namespace ap {
 
-// How one channel (web pages or mail) decides and reports. The decision step reads
-// threshold_loud right after threshold: keep the two adjacent and in this order.
+// How one channel (web pages or mail) decides and reports. The decision step takes the
+// whole block, so it never depends on how the fields are laid out.
 struct ChannelConfig {
   bool loud = false;
   float loud_probability = 0.0f;

@@ -11,8 +11,8 @@ void load(WebCheckerV3Data& knowledge, std::shared_ptr<ap::FileIO> file) {
   auto container = std::make_shared<ap::PackedFile>(std::move(file));
   knowledge.whiteDomains = LoadTestWhiteDoms(*container);
   lex::LoadWordsDB(*container, knowledge.lexemes);
-  knowledge.webSolver = std::make_shared<SimpleSolver>(kWebFlowEntry, container);
-  knowledge.mailSolver = std::make_shared<SimpleSolver>(kMailFlowEntry, container);
+  knowledge.webSolver = std::make_shared<SimpleSolver>(kWebFlowEntry, container, kWebVectorSize);
+  knowledge.mailSolver = std::make_shared<SimpleSolver>(kMailFlowEntry, container, kMailVectorSize);
   knowledge.shareLinks = ap::LoadHostsPathesDB(*container);
   knowledge.categorisedHosts = hpdb::LoadHashedCatHostsPathes(*container);
   ap::LoadEngineConfig(*container, knowledge.config);

@@ -3,6 +3,7 @@
 // fault ends the load; nothing is caught here.
 #pragma once
 
+#include <cstddef>
 #include <memory>
 
 #include "engine/common/file_interfaces.h"
@@ -12,6 +13,11 @@ namespace loaders_misc {
 
 inline constexpr char kWebFlowEntry[] = "web.flow";
 inline constexpr char kMailFlowEntry[] = "mail.flow";
+
+// The vectors the checkers hand the decision models: a web page's features, and a mail's
+// page features followed by its 81 link features. A model reading past them is refused.
+inline constexpr std::size_t kWebVectorSize = 214;
+inline constexpr std::size_t kMailVectorSize = 260;
 
 // Order: white domains and organisations ("wdb", "orgs"), lexemes ("lexdb.txt"), the web and
 // mail decision objects ("web.flow", "mail.flow"), share links ("share_links.txt"),

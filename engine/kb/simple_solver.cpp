@@ -26,19 +26,30 @@ std::string ReadFlowFile(const std::string& entry, ap::FileSystemI& files) {
   return text;
 }
 
-}  // namespace
-
-SimpleSolver::SimpleSolver(const std::string& entry, std::shared_ptr<ap::FileSystemI> files) {
+std::unique_ptr<ml::DeepSolver> LoadModel(const std::string& entry,
+                                          std::shared_ptr<ap::FileSystemI> files) {
   if (files == nullptr) ap::ThrowError("Absent flow file " + entry);
   const std::string text = ReadFlowFile(entry, *files);
-  model_ = std::make_unique<ml::DeepSolver>(text, std::move(files));
+  return std::make_unique<ml::DeepSolver>(text, std::move(files));
+}
+
+}  // namespace
+
+SimpleSolver::SimpleSolver(const std::string& entry, std::shared_ptr<ap::FileSystemI> files)
+    : model_(LoadModel(entry, std::move(files))) {}
+
+SimpleSolver::SimpleSolver(const std::string& entry, std::shared_ptr<ap::FileSystemI> files,
+                           std::size_t inputSize) {
+  std::unique_ptr<ml::DeepSolver> model = LoadModel(entry, std::move(files));
+  model->CheckInputSize(inputSize);
+  model_ = std::move(model);
 }
 
 SimpleSolver::SimpleSolver(std::unique_ptr<WebCheckerV3Data::AbstractNetI> model)
     : model_(std::move(model)) {}
 
 WebCheckerV3Data::Decision SimpleSolver::Solve(const std::vector<float>& features,
-                                               const float* thresholds) const {
+                                               const ap::ChannelConfig& thresholds) const {
   std::vector<float> outputs;
   model_->calc(features, outputs);
   WebCheckerV3Data::Decision decision;
@@ -51,10 +62,10 @@ WebCheckerV3Data::Decision SimpleSolver::Solve(const std::vector<float>& feature
   const float a = decision.detected ? 1.0f - o0 : o0;
   const float b = decision.detected ? 1.0f - o1 : o1;
   const float distance = std::sqrt(a * a + b * b);
-  if (distance > thresholds[0]) {
+  if (distance > thresholds.threshold) {
     decision.detected = false;
   } else if (decision.detected) {
-    decision.outside_loud = distance > thresholds[1];
+    decision.outside_loud = distance > thresholds.threshold_loud;
   }
   for (std::size_t i = 0; i < outputs.size(); ++i) {
     if (i != 0) decision.annotation += ' ';

@@ -19,15 +19,18 @@ class SimpleSolver final : public WebCheckerV3Data::Solver {
  public:
   // Builds the deep solver from the flow file `entry` of `files`; the conversions' sources
   // are opened from `files` too. A missing, empty, unreadable or oversized entry raises
-  // ap::Error; the solver's own faults propagate.
+  // ap::Error; the solver's own faults propagate. With `inputSize`, a flow that reads
+  // features past it is refused now, with the message its calc would give.
   SimpleSolver(const std::string& entry, std::shared_ptr<ap::FileSystemI> files);
+  SimpleSolver(const std::string& entry, std::shared_ptr<ap::FileSystemI> files,
+               std::size_t inputSize);
   // Decides with a model built elsewhere.
   explicit SimpleSolver(std::unique_ptr<WebCheckerV3Data::AbstractNetI> model);
 
   // detected: o0 > 0.5 and (o0, o1) within `threshold` of (1, 1); outside_loud: detected and
   // farther than `threshold_loud` from it. Fewer than two outputs decide nothing.
   WebCheckerV3Data::Decision Solve(const std::vector<float>& features,
-                                   const float* thresholds) const override;
+                                   const ap::ChannelConfig& thresholds) const override;
 
   const WebCheckerV3Data::AbstractNetI& model() const { return *model_; }
 

@@ -34,9 +34,10 @@ class WebCheckerV3Data {
 
   class Solver {
    public:
-    // `thresholds` points at two floats: the detection radius `threshold`, then
-    // `threshold_loud`. Model faults propagate.
-    virtual Decision Solve(const std::vector<float>& features, const float* thresholds) const = 0;
+    // Decides against the channel's radii `threshold` and `threshold_loud`. Model faults
+    // propagate.
+    virtual Decision Solve(const std::vector<float>& features,
+                           const ap::ChannelConfig& thresholds) const = 0;
     virtual ~Solver() = default;
   };
 

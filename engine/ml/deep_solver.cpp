@@ -124,6 +124,25 @@ DeepSolver::DeepSolver(const std::string& text, std::shared_ptr<ap::FileSystemI>
   order_.assign(order.begin(), order.end());
 }
 
+namespace {
+
+[[noreturn]] void ThrowRangePastInput(const DeepSolver::Flow& flow, const DeepSolver::FlowInput& in,
+                                      std::size_t size) {
+  throw std::runtime_error("Deep solver flow " + flow.name + " reads features [" +
+                           std::to_string(in.from) + ", " + std::to_string(in.to) +
+                           ") of an input of " + std::to_string(size));
+}
+
+}  // namespace
+
+void DeepSolver::CheckInputSize(std::size_t size) const {
+  for (const Flow& flow : flows_) {
+    for (const FlowInput& in : flow.inputs) {
+      if (in.tag == FlowInput::Tag::kRange && in.to > size) ThrowRangePastInput(flow, in, size);
+    }
+  }
+}
+
 void DeepSolver::calc(const std::vector<float>& input, std::vector<float>& output) const {
   if (order_.empty()) {
     output.clear();
@@ -137,11 +156,7 @@ void DeepSolver::calc(const std::vector<float>& input, std::vector<float>& outpu
       const float* first;
       std::size_t count;
       if (in.tag == FlowInput::Tag::kRange) {
-        if (in.to > input.size()) {
-          throw std::runtime_error("Deep solver flow " + flow->name + " reads features [" +
-                                   std::to_string(in.from) + ", " + std::to_string(in.to) +
-                                   ") of an input of " + std::to_string(input.size()));
-        }
+        if (in.to > input.size()) ThrowRangePastInput(*flow, in, input.size());
         first = input.data() + in.from;
         count = in.to - in.from;
       } else {

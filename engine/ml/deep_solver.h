@@ -67,6 +67,11 @@ class DeepSolver final : public WebCheckerV3Data::AbstractNetI {
   // A range reaching past the input throws std::runtime_error; conversion faults propagate.
   void calc(const std::vector<float>& input, std::vector<float>& output) const override;
 
+  // Raises the error calc would raise on an input of `size` features when a flow reads a
+  // range past it, so that a model that does not fit its channel's vector is refused when it
+  // loads rather than at every decision.
+  void CheckInputSize(std::size_t size) const;
+
   const std::vector<std::unique_ptr<ConversionI>>& conversions() const { return conversions_; }
   const std::vector<Flow>& flows() const { return flows_; }  // in definition order
   const std::vector<const Flow*>& order() const { return order_; }

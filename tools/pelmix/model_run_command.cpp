@@ -133,7 +133,7 @@ bool ParseThreshold(const std::string& text, float& value) {
 
 int RunModelRun(const std::vector<std::string>& args, const GlobalOptions&) {
   std::string kb, dir, flow;
-  float thresholds[2] = {0.01f, 0.0f};
+  ap::ChannelConfig thresholds;  // threshold 0.01, threshold_loud 0
   for (std::size_t i = 0; i < args.size(); ++i) {
     const std::string& arg = args[i];
     const bool takesValue =
@@ -143,8 +143,8 @@ int RunModelRun(const std::vector<std::string>& args, const GlobalOptions&) {
       const std::string& value = args[++i];
       if (arg == "--kb") kb = value;
       if (arg == "--dir") dir = value;
-      if ((arg == "--threshold" && !ParseThreshold(value, thresholds[0])) ||
-          (arg == "--threshold-loud" && !ParseThreshold(value, thresholds[1]))) {
+      if ((arg == "--threshold" && !ParseThreshold(value, thresholds.threshold)) ||
+          (arg == "--threshold-loud" && !ParseThreshold(value, thresholds.threshold_loud))) {
         return UsageError("model run: " + arg + " needs a decimal number, not " + value);
       }
     } else if (!arg.empty() && arg[0] == '-') {

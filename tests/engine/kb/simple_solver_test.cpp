@@ -31,7 +31,9 @@ class FixedModel final : public WebCheckerV3Data::AbstractNetI {
 
 Decision Decide(std::vector<float> outputs, float threshold, float threshold_loud) {
   const SimpleSolver solver(std::make_unique<FixedModel>(std::move(outputs)));
-  const float thresholds[2] = {threshold, threshold_loud};
+  ap::ChannelConfig thresholds;
+  thresholds.threshold = threshold;
+  thresholds.threshold_loud = threshold_loud;
   return solver.Solve({}, thresholds);
 }
 
@@ -114,10 +116,10 @@ const char kFlow[] =
     R"({"convs":{"s":{"type":"sqrtboost"}},"flow":[{"name":"a","input":[[0,2]],"conv":"s"}]})";
 
 TEST(SimpleSolver, LoadsItsModelFromAnEntry) {
-  auto files = std::make_shared<PieceFileSystem>(
-      std::map<std::string, std::string>{{"web.flow", kFlow}}, 3);
+  auto files =
+      std::make_shared<PieceFileSystem>(std::map<std::string, std::string>{{"web.flow", kFlow}}, 3);
   const SimpleSolver solver("web.flow", files);
-  const float thresholds[2] = {0.01f, 0.0f};
+  const ap::ChannelConfig thresholds;  // 0.01 and 0
   const Decision d = solver.Solve({0.9999f, 0.99999f}, thresholds);
   EXPECT_TRUE(d.detected);
   EXPECT_TRUE(d.outside_loud);
@@ -142,6 +144,25 @@ TEST(SimpleSolver, RefusesMissingBrokenAndOversizedEntries) {
   EXPECT_EQ(failure({{"mail.flow", std::string(kMaxFlowFileSize + 1, '[')}}),
             "Flow file mail.flow is larger than 1048576 bytes");
   EXPECT_THROW(SimpleSolver("web.flow", nullptr), ap::Error);
+}
+
+TEST(SimpleSolver, RefusesAModelReadingPastItsChannelsVector) {
+  const std::string flow =
+      R"({"convs":{"s":{"type":"sqrtboost"}},"flow":[{"name":"a","input":[[0,2]],"conv":"s"},)"
+      R"({"name":"7","input":["a",[200,215]],"conv":"s"}]})";
+  auto files = std::make_shared<PieceFileSystem>(
+      std::map<std::string, std::string>{{"web.flow", flow}, {"fits.flow", kFlow}});
+  // The message is the one every decision would otherwise fail with, naming the flow.
+  try {
+    SimpleSolver("web.flow", files, 214);
+    ADD_FAILURE() << "a flow reading features up to 215 loaded for a vector of 214";
+  } catch (const std::runtime_error& e) {
+    EXPECT_STREQ(e.what(), "Deep solver flow 7 reads features [200, 215) of an input of 214");
+  }
+  EXPECT_NO_THROW(SimpleSolver("web.flow", files, 215));
+  EXPECT_NO_THROW(SimpleSolver("web.flow", files));  // no channel: no check
+  EXPECT_THROW(SimpleSolver("fits.flow", files, 1), std::runtime_error);
+  EXPECT_NO_THROW(SimpleSolver("fits.flow", files, 2));
 }
 
 }  // namespace

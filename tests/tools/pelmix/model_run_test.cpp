@@ -71,7 +71,7 @@ TEST_F(ModelRun, DirectoryAndContainerAgreeWithTheEngine) {
   // The same lines, made in process from the same files.
   const loaders_misc::SimpleSolver solver(
       "web.flow", std::make_shared<pelmix::testing::PieceFileSystem>(kModel));
-  const float thresholds[2] = {0.01f, 0.0f};
+  const ap::ChannelConfig thresholds;  // 0.01 and 0
   std::istringstream lines(input);
   std::string expected, line;
   while (std::getline(lines, line)) {

@@ -144,12 +144,24 @@ TEST_F(ServiceAbi, DamagedContainerAndEntries) {
   ExpectLoadFailure("", uvo::kErrUnexpected, "uvo::Exception ");  // the adapter's own check
 }
 
+// The example model's flow file with its encoding reading features [0, to).
+std::string FlowReading(const std::string& rules, int to) {
+  return R"({"convs":{"boost":{"type":"sqrtboost"},"enc":{"type":"rules","src":")" + rules +
+         R"("},"net":{"type":"neur","src":"example.net"}},"flow":[{"name":"signals","input":[[0,)" +
+         std::to_string(to) +
+         R"(]],"conv":"enc"},{"name":"scores","input":["signals"],"conv":"net"},)"
+         R"({"name":"out","input":["scores"],"conv":"boost"}]})";
+}
+
 struct MissingOrDamaged {
   std::string container;
   std::string text;
 };
 
 TEST_F(ServiceAbi, EveryEntryFailsTheLoadAsDocumented) {
+  // The example model reads exactly the vectors the checkers make.
+  ASSERT_EQ(ExampleEntries().at("web.flow"), FlowReading("web.rules", 214));
+  ASSERT_EQ(ExampleEntries().at("mail.flow"), FlowReading("mail.rules", 260));
   const std::vector<MissingOrDamaged> rows = {
       {Without("wdb"), "null pointer to readable in WhiteDomains"},
       {Without("orgs"), "Failed to load orgs db - null file"},
@@ -159,6 +171,11 @@ TEST_F(ServiceAbi, EveryEntryFailsTheLoadAsDocumented) {
       {Without("mail.flow"), "Absent flow file mail.flow"},
       {Replacing("mail.flow", "{\"convs\":{}}"),
        "Deep solver config error: Exact 2 elements expected in hash"},
+      // A model that reads past its channel's vector is a broken knowledge base.
+      {Replacing("web.flow", FlowReading("web.rules", 215)),
+       "Deep solver flow signals reads features [0, 215) of an input of 214"},
+      {Replacing("mail.flow", FlowReading("mail.rules", 261)),
+       "Deep solver flow signals reads features [0, 261) of an input of 260"},
       {Without("share_links.txt"), "null readable for tell"},
       {Replacing("sb.db", std::string("\x01", 1)), "HPDB: Invalid db format"},
       {Without("v3.cfg"), "Configuration entry v3.cfg not found"},
