@@ -4,6 +4,7 @@
 #include <cstdint>
 
 #include "framework/uvo/interfaces.h"
+#include "framework/uvo/string8.h"
 
 namespace cf::services::anti_phishing {
 
@@ -21,15 +22,83 @@ struct SessionParam {
   const char* value;
 };
 
+// A web-session parameter of this engine's own: with the value "1", GetHeuristicVerdictInfo
+// also traces (level 700) the feature vector the model judged: the session prefix, the
+// operation's full name, ": features:" and each float (%.9g) after a blank.
+inline constexpr char kTraceFeaturesParameter[] = "pelmix.trace_features";
+
 // A contiguous range of parameters, [begin, end).
 struct SessionParamList {
   const SessionParam* begin;
   const SessionParam* end;
 };
 
-class IHttpSession;
-class IMailSession;
-class IHttpExternalSink;
+// A byte range [begin, end): the HTML a host appends, the data a host delivers to a sink.
+struct ByteRange {
+  const char* begin;
+  const char* end;
+};
+
+// What GetVerdict answers.
+struct Verdict {
+  bool phishingDetected;
+  bool confirmedVerdict;  // never set by this engine
+};
+
+// What GetHeuristicVerdictInfo answers. The host owns the record; the module fills `target`
+// with memory from the host allocator that the string gives back when it is destroyed or
+// reassigned (framework/uvo/string8.h).
+struct HeuristicVerdictInfo {
+  bool quiet;               // the details below are not meant to be reported
+  std::uint8_t confidence;  // 0..2, from the session's protection level
+  double weight;
+  uvo::String8 target;   // what the page imitates, annotations joined by '|'
+  std::int64_t dbstamp;  // the knowledge base's release stamp
+};
+
+// A web session: the host appends a page's HTML, then asks for the verdict.
+class IHttpSession : public uvo::IObject {
+ public:
+  static constexpr uvo::iid_t kIid = 0xAE565BA6;
+  // An empty range answers 1 ("False") and does nothing.
+  virtual uvo::result_t AppendHtml(ByteRange html) = 0;                          // slot 3
+  virtual uvo::result_t GetVerdict(Verdict* out) = 0;                            // slot 4
+  virtual uvo::result_t GetHeuristicVerdictInfo(HeuristicVerdictInfo* out) = 0;  // slot 5
+
+ protected:
+  ~IHttpSession() = default;
+};
+
+// A mail session: the host hands over the message's parts, then asks for the verdict.
+class IMailSession : public uvo::IObject {
+ public:
+  static constexpr uvo::iid_t kIid = 0x681D3C0A;
+  virtual uvo::result_t AddText(uvo::IStream* stream) = 0;   // slot 3
+  virtual uvo::result_t AddImage(uvo::IStream* stream) = 0;  // slot 4
+  virtual uvo::result_t AddAttachment(const char* name, const char* contentType,
+                                      uvo::IStream* stream) = 0;     // slot 5
+  virtual uvo::result_t AddUrl(const char* url, bool* out) = 0;      // slot 6
+  virtual uvo::result_t Reserved() = 0;                              // slot 7: no effect
+  virtual uvo::result_t SetMessageSubject(const char* subject) = 0;  // slot 8
+  virtual uvo::result_t GetVerdict(Verdict* out) = 0;                // slot 9
+  virtual uvo::result_t GetHeuristicVerdictInfo(HeuristicVerdictInfo* out) = 0;  // slot 10
+
+ protected:
+  ~IMailSession() = default;
+};
+
+// Where a host's external data source delivers what it fetched for a page.
+class IHttpExternalSink : public uvo::IObject {
+ public:
+  static constexpr uvo::iid_t kIid = 0x532F97F5;
+  virtual uvo::result_t SetSessionParams(const SessionParamList* params) = 0;  // slot 3
+  virtual uvo::result_t AppendData(ByteRange data) = 0;                        // slot 4
+  // Ends the delivery: later calls of the other two reach nothing.
+  virtual uvo::result_t Close() = 0;  // slot 5
+
+ protected:
+  ~IHttpExternalSink() = default;
+};
 
 // A host object that can fetch further data for a page into a sink.
 class IHttpExternalDataSource : public uvo::IObject {
