@@ -10,6 +10,7 @@
 #include "framework/uvo/result.h"
 #include "internal/helpers/io_adapters/antiphishing_io_adapter.h"
 #include "internal/helpers/tracer/trace_writer.h"
+#include "services/anti_phishing/heuristic/source/http_session.h"
 
 namespace cf::services::anti_phishing::heuristic {
 namespace {
@@ -144,7 +145,8 @@ uvo::result_t AntiPhishing::IsDomainWhite(const char* domain, bool* out) {
 }
 
 uvo::result_t AntiPhishing::CreateWebSession(const char* place, const SessionSettings* settings,
-                                             const char* url, IHttpSession** out) {
+                                             const char* url, const SessionParamList* params,
+                                             IHttpExternalDataSource* source, IHttpSession** out) {
   if (out == nullptr) return uvo::kErrInvalidArgument;
   try {
     UVO_CHECK(checkFactory_ != nullptr);
@@ -156,24 +158,28 @@ uvo::result_t AntiPhishing::CreateWebSession(const char* place, const SessionSet
         checkFactory_->CreateWebChecker(page, confidence);
     if (!checker) throw std::runtime_error("Can't create web checker");
     const std::string prefix = SessionPrefix("http session");
-    // Web sessions are not part of this build yet.
-    throw std::runtime_error("Can't create new session");
+    auto session = uvo::Ptr<HttpSession>::Adopt(HttpSession::Create(services_.locator.Get(), prefix,
+                                                                    std::move(checker), *settings,
+                                                                    params, tracerHolder_, source));
+    if (!session) throw std::runtime_error("Can't create new session");
+    *out = session.Detach();
+    return uvo::kOk;
   } catch (...) {
     return dispatcher_.Dispatch(place);
   }
 }
 
 uvo::result_t AntiPhishing::CreateSession(const SessionSettings* settings, const char* url,
-                                          const SessionParamList* /*params*/, IHttpSession** out) {
-  return CreateWebSession(kCreateSession, settings, url, out);
+                                          const SessionParamList* params, IHttpSession** out) {
+  return CreateWebSession(kCreateSession, settings, url, params, nullptr, out);
 }
 
 uvo::result_t AntiPhishing::CreateSessionWithExternalDataSource(const SessionSettings* settings,
                                                                 const char* url,
-                                                                const SessionParamList* /*params*/,
-                                                                IHttpExternalDataSource* /*source*/,
+                                                                const SessionParamList* params,
+                                                                IHttpExternalDataSource* source,
                                                                 IHttpSession** out) {
-  return CreateWebSession(kCreateSessionWithExternalDataSource, settings, url, out);
+  return CreateWebSession(kCreateSessionWithExternalDataSource, settings, url, params, source, out);
 }
 
 uvo::result_t AntiPhishing::CreateSession(const SessionSettings* settings, IMailSession** out) {

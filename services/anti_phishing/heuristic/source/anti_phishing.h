@@ -59,8 +59,10 @@ class AntiPhishing final : public uvo::ObjectImpl<AntiPhishing, IAntiPhishingSer
  private:
   void Initialize(uvo::IStream* knowledgeFile, std::shared_ptr<TracerHolder> tracerHolder,
                   const CheckFactoryBuilder& build);
+  // Both web CreateSession operations; `source` is null for the plain one.
   uvo::result_t CreateWebSession(const char* place, const SessionSettings* settings,
-                                 const char* url, IHttpSession** out);
+                                 const char* url, const SessionParamList* params,
+                                 IHttpExternalDataSource* source, IHttpSession** out);
 
   uvo::detail::ObjectModuleAutoLock moduleLock_;
   helpers::LocatorServices services_;

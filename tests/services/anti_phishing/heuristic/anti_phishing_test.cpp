@@ -10,6 +10,7 @@
 #include "framework/uvo/exception.h"
 #include "host/host.h"
 #include "host/stream.h"
+#include "tests/support/fake_web_checker.h"
 
 namespace {
 
@@ -20,9 +21,11 @@ using heuristic::AntiPhishing;
 class FakeCheckFactory : public ap::easy2::CheckFactoryI {
  public:
   enum class Failure { kNone, kMemory, kRuntime };
-  std::shared_ptr<ap::easy2::WebCheckerI> CreateWebChecker(const std::string&, int) override {
+  std::shared_ptr<ap::easy2::WebCheckerI> CreateWebChecker(const std::string& url,
+                                                           int confidence) override {
     ++checkersAsked;
-    return nullptr;
+    urls.push_back(url + " " + std::to_string(confidence));
+    return makeCheckers ? std::make_shared<pelmix::testing::FakeWebChecker>() : nullptr;
   }
   std::shared_ptr<ap::easy2::MailCheckerI> CreateMailChecker(int) override {
     ++checkersAsked;
@@ -36,6 +39,8 @@ class FakeCheckFactory : public ap::easy2::CheckFactoryI {
     return domain == "white.example";
   }
   Failure failure = Failure::kNone;
+  bool makeCheckers = false;
+  std::vector<std::string> urls;
   int whiteAsked = 0;
   int checkersAsked = 0;
 };
@@ -139,6 +144,45 @@ TEST_F(AntiPhishingService, EmptyCheckersAreFailuresNotSessions) {
                 "cf::services::anti_phishing::heuristic::AntiPhishing::CreateSession: "
                 "Can't create mail checker"}));
   EXPECT_EQ(service_->CreateSession(&settings, "u", nullptr, nullptr), uvo::kErrInvalidArgument);
+}
+
+// The number in a session's trace prefix, read from its details line.
+unsigned SessionNumber(IHttpSession* session, pelmix::host::Tracer& tracer) {
+  tracer.Clear();
+  HeuristicVerdictInfo info{};
+  EXPECT_EQ(session->GetHeuristicVerdictInfo(&info), 0);
+  const std::string line = tracer.Texts().at(0);
+  EXPECT_EQ(line.rfind("http session ", 0), 0u) << line;
+  return static_cast<unsigned>(std::stoul(line.substr(13)));
+}
+
+TEST_F(AntiPhishingService, WebSessionsAreNumberedInCreationOrder) {
+  factory_->makeCheckers = true;
+  SessionSettings settings{3};
+  uvo::Ptr<IHttpSession> first, second, third;
+  ASSERT_EQ(service_->CreateSession(&settings, "http://a.example/", nullptr, first.Receive()), 0);
+  // Refused levels neither make a checker nor use a number.
+  for (const int level : {0, 4}) {
+    SessionSettings bad{level};
+    IHttpSession* none = nullptr;
+    EXPECT_EQ(service_->CreateSession(&bad, "http://a.example/", nullptr, &none),
+              uvo::kErrUnspecified);
+  }
+  ASSERT_EQ(service_->CreateSessionWithExternalDataSource(&settings, "http://b.example/", nullptr,
+                                                          nullptr, second.Receive()),
+            0);
+  ASSERT_EQ(service_->CreateSession(&settings, "", nullptr, third.Receive()), 0);
+  EXPECT_EQ(factory_->urls,
+            (std::vector<std::string>{"http://a.example/ 0", "http://b.example/ 0", " 0"}));
+  const unsigned n = SessionNumber(first.Get(), *host_.tracer.Get());
+  EXPECT_EQ(SessionNumber(second.Get(), *host_.tracer.Get()), n + 1);
+  EXPECT_EQ(SessionNumber(third.Get(), *host_.tracer.Get()), n + 2);
+  // A session outlives the service that made it.
+  service_->Release();
+  service_ = nullptr;
+  Verdict verdict{true, true};
+  EXPECT_EQ(first->GetVerdict(&verdict), 0);
+  EXPECT_FALSE(verdict.phishingDetected);
 }
 
 TEST_F(AntiPhishingService, IsDomainWhiteResultCodes) {
