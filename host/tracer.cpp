@@ -2,10 +2,24 @@
 
 #include <algorithm>
 #include <cstring>
+#include <utility>
 
 #include "framework/uvo/result.h"
 
 namespace pelmix::host {
+namespace {
+
+thread_local Tracer::ThreadCapture* currentCapture = nullptr;
+
+}  // namespace
+
+Tracer::ThreadCapture::ThreadCapture(int level) : level_(level), previous_(currentCapture) {
+  currentCapture = this;
+}
+
+Tracer::ThreadCapture::~ThreadCapture() { currentCapture = previous_; }
+
+std::vector<TraceLine> Tracer::ThreadCapture::Take() { return std::exchange(lines_, {}); }
 
 uvo::Ptr<Tracer> Tracer::Create(int level) { return uvo::Ptr<Tracer>::Adopt(new Tracer(level)); }
 
@@ -25,7 +39,8 @@ uvo::result_t Tracer::CreateRecord(int level, char** buffer, std::uint32_t size)
     regrows_.push_back(size);
     return uvo::kOk;
   }
-  if (refuseRecords_ || level > level_) return uvo::kFalse;
+  const int seen = currentCapture != nullptr ? std::max(level_, currentCapture->level_) : level_;
+  if (refuseRecords_ || level > seen) return uvo::kFalse;
   Record record{level, std::make_unique<char[]>(size), size};
   char* key = record.data.get();
   open_.emplace(key, std::move(record));
@@ -37,9 +52,14 @@ uvo::result_t Tracer::CommitRecord(char* buffer, std::uint32_t length) {
   std::lock_guard<std::mutex> lock(mutex_);
   auto it = open_.find(buffer);
   if (it == open_.end() || length > it->second.size) return uvo::kErrInvalidArgument;
-  lines_.push_back({it->second.level, std::string(buffer, length)});
+  TraceLine line{it->second.level, std::string(buffer, length)};
   open_.erase(it);
-  if (echo_ != nullptr) (*echo_) << lines_.back().text << '\n' << std::flush;
+  if (echo_ != nullptr && line.level <= level_) (*echo_) << line.text << '\n' << std::flush;
+  if (currentCapture != nullptr) {
+    currentCapture->lines_.push_back(std::move(line));
+  } else {
+    lines_.push_back(std::move(line));
+  }
   return uvo::kOk;
 }
 
@@ -65,7 +85,7 @@ uvo::result_t Tracer::GetCommittedCount(std::uint64_t* count) {
 uvo::result_t Tracer::GetTraceLevel(int* level) {
   if (level == nullptr) return uvo::kErrInvalidArgument;
   std::lock_guard<std::mutex> lock(mutex_);
-  *level = level_;
+  *level = currentCapture != nullptr ? std::max(level_, currentCapture->level_) : level_;
   return uvo::kOk;
 }
 

@@ -24,6 +24,26 @@ struct TraceLine {
 
 class Tracer final : public uvo::ObjectImpl<Tracer, uvo::ITracer, uvo::ITraceLevelSource> {
  public:
+  // While one is alive on a thread, every tracer sees that thread at least at the capture's
+  // level, and lines committed on it go to the capture instead of the tracer's list (they
+  // are still echoed when the tracer's own level admits them). A host that runs one session
+  // per thread thus gets each session's lines apart, and a long run keeps no lines.
+  class ThreadCapture {
+   public:
+    explicit ThreadCapture(int level);
+    ~ThreadCapture();
+    ThreadCapture(const ThreadCapture&) = delete;
+    ThreadCapture& operator=(const ThreadCapture&) = delete;
+    // The lines captured so far; the capture starts empty again.
+    std::vector<TraceLine> Take();
+
+   private:
+    friend class Tracer;
+    int level_;
+    std::vector<TraceLine> lines_;
+    ThreadCapture* previous_;
+  };
+
   static uvo::Ptr<Tracer> Create(int level = 1000);
   explicit Tracer(int level) : level_(level) {}
   ~Tracer() = default;
