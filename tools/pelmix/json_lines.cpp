@@ -44,6 +44,12 @@ JsonLine& JsonLine::Bool(std::string_view key, bool value) {
   return *this;
 }
 
+JsonLine& JsonLine::Raw(std::string_view key, std::string_view json) {
+  Key(key);
+  text_.append(json);
+  return *this;
+}
+
 void JsonLine::Write(std::ostream& out) {
   text_.push_back('}');
   text_.push_back('\n');

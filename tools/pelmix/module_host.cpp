@@ -1,5 +1,6 @@
 #include "tools/pelmix/module_host.h"
 
+#include <filesystem>
 #include <iostream>
 
 #include "framework/uvo/result.h"
@@ -26,6 +27,13 @@ uvo::result_t ModuleHost::CreateServiceFactory(
   if (result < 0) return result;
   return factory->CreateInstance(host_.locator.Get(), IAntiPhishingServiceFactory::kIid,
                                  out->ReceiveVoid());
+}
+
+std::string DefaultKnowledgeBase() {
+  std::error_code error;
+  const std::filesystem::path self = std::filesystem::read_symlink("/proc/self/exe", error);
+  if (error) return "example.kb";
+  return (self.parent_path() / ".." / "example.kb").lexically_normal().string();
 }
 
 std::string DescribeResult(uvo::result_t code) {

@@ -1,0 +1,44 @@
+// One page through the module's web-session ABI, as any host would judge it: a session on
+// the page URL, the page appended in chunks, then the verdict and the heuristic details. The
+// session's own trace lines are taken apart on the calling thread (the failure line that
+// explains a refusal, the feature vector when asked for).
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "framework/uvo/anti_phishing.h"
+
+namespace pelmix::cli {
+
+struct PageInput {
+  std::string path;  // "-" for stdin
+  std::string url;
+  std::string error;  // set when the input was refused before reading (a bad directory entry)
+};
+
+struct PageScanOptions {
+  std::int32_t level = 2;
+  std::size_t chunk = 4096;
+  bool features = false;
+};
+
+struct PageResult {
+  std::string error;  // empty when the page was judged
+  bool phishing = false;
+  bool quiet = true;
+  double weight = 0;
+  std::string target;
+  int confidence = 0;
+  std::int64_t dbstamp = 0;
+  // The vector the model judged, as the module wrote it (%.9g each); none for a trusted page.
+  std::optional<std::vector<std::string>> features;
+};
+
+PageResult ScanPage(cf::services::anti_phishing::IHttpSessionFactory& sessions,
+                    const PageInput& input, const PageScanOptions& options);
+
+}  // namespace pelmix::cli
