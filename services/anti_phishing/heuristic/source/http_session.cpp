@@ -1,7 +1,6 @@
 #include "services/anti_phishing/heuristic/source/http_session.h"
 
 #include <cstdio>
-#include <cstring>
 #include <vector>
 
 #include "framework/uvo/exception.h"
@@ -31,12 +30,15 @@ HttpSession* HttpSession::Create(uvo::IServiceLocator* locator, const std::strin
   session->Initialize(prefix, std::move(checker), settings.protectionLevel,
                       std::move(tracerHolder));
   if (params != nullptr) {
-    for (const SessionParam* p = params->begin; p != nullptr && p != params->end; ++p) {
-      UVO_CHECK(p->name != nullptr && p->value != nullptr);
-      session->checker_->SetParameter(p->name, p->value);
-      if (std::strcmp(p->name, kTraceFeaturesParameter) == 0) {
-        session->traceFeatures_ = std::strcmp(p->value, "1") == 0;
-      }
+    // A reversed or half-null range would walk outside the host's list.
+    UVO_CHECK((params->begin == nullptr) == (params->end == nullptr));
+    UVO_CHECK(params->begin <= params->end);
+    for (const SessionParam* p = params->begin; p != params->end; ++p) {
+      // A null name or value reads as empty, as the external data sink reads them.
+      const std::string name = p->name != nullptr ? p->name : "";
+      const std::string value = p->value != nullptr ? p->value : "";
+      session->checker_->SetParameter(name, value);
+      if (name == kTraceFeaturesParameter) session->traceFeatures_ = value == "1";
     }
   }
   // After the parameters, when the checker is in place.

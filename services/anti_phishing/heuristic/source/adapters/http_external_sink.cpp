@@ -43,7 +43,9 @@ uvo::result_t HttpExternalSink::SetSessionParams(const SessionParamList* params)
   try {
     const std::shared_ptr<ap::easy2::ExtDataReceiver> receiver = Receiver();
     if (receiver == nullptr || params == nullptr) return uvo::kOk;
-    for (const SessionParam* p = params->begin; p != nullptr && p != params->end; ++p) {
+    UVO_CHECK((params->begin == nullptr) == (params->end == nullptr));
+    UVO_CHECK(params->begin <= params->end);
+    for (const SessionParam* p = params->begin; p != params->end; ++p) {
       receiver->SetParameter(Copy(p->name), Copy(p->value));
     }
     return uvo::kOk;

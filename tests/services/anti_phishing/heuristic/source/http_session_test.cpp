@@ -58,6 +58,15 @@ TEST_F(HttpSessionTest, CreationChecksAndParameters) {
             (std::vector<std::string>{"param b=2", "param a=1", "param a=", "handler"}));
   EXPECT_NE(checker_->extHandler, nullptr);
   EXPECT_EQ(source->Requests().size(), 0u);  // nothing is asked of the source by itself
+
+  // A reversed list is refused before any parameter is handed over; null texts read as "".
+  checker_->calls.clear();
+  const SessionParamList reversed{params + 2, params};
+  EXPECT_THROW(Make(2, &reversed), uvo::CheckFailedException);
+  const SessionParam nulls[] = {{nullptr, "v"}, {"n", nullptr}};
+  const SessionParamList withNulls{nulls, nulls + 2};
+  Make(2, &withNulls);
+  EXPECT_EQ(checker_->calls, (std::vector<std::string>{"param =v", "param n="}));
 }
 
 TEST_F(HttpSessionTest, AppendHtml) {
