@@ -2,6 +2,7 @@
 
 #include <stdexcept>
 
+#include "engine/checkers/web_checker_v3.h"
 #include "engine/kb/kb_loader.h"
 
 namespace easy3_impl {
@@ -15,8 +16,9 @@ std::shared_ptr<const WebCheckerV3Data> CheckFactoryV3::Load(std::shared_ptr<ap:
 CheckFactoryV3::CheckFactoryV3(std::shared_ptr<ap::FileIO> file)
     : knowledge_(Load(std::move(file))), whiteDomains_(*knowledge_->whiteDomains) {}
 
-std::shared_ptr<ap::easy2::WebCheckerI> CheckFactoryV3::CreateWebChecker(const std::string&, int) {
-  throw std::runtime_error("CheckFactoryV3: web checking is not available in this build");
+std::shared_ptr<ap::easy2::WebCheckerI> CheckFactoryV3::CreateWebChecker(const std::string& url,
+                                                                         int) {
+  return std::make_shared<WebCheckerV3>(knowledge_, url);
 }
 
 std::shared_ptr<ap::easy2::MailCheckerI> CheckFactoryV3::CreateMailChecker(int) {

@@ -2,7 +2,14 @@
 
 #include <vector>
 
+#include "engine/features/feature_layout.h"
+#include "engine/kb/kb_loader.h"
+
 namespace easy3_impl {
+
+// The loader refuses models that read past these; they must be what the extractor makes.
+static_assert(loaders_misc::kWebVectorSize == html_features::kWebVectorSize);
+static_assert(loaders_misc::kMailVectorSize == html_features::kMailVectorSize);
 
 WebCheckerV3::WebCheckerV3(std::shared_ptr<const WebCheckerV3Data> data, const std::string& url,
                            FileTimeClock clock)
