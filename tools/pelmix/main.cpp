@@ -9,6 +9,7 @@
 #include <iostream>
 
 #include "tools/pelmix/command.h"
+#include "tools/pelmix/module_host.h"
 
 namespace pelmix::cli {
 namespace {
@@ -16,13 +17,6 @@ namespace {
 std::vector<Command>& Registry() {
   static std::vector<Command> commands;
   return commands;
-}
-
-std::string DefaultModulePath() {
-  std::error_code error;
-  const std::filesystem::path self = std::filesystem::read_symlink("/proc/self/exe", error);
-  if (error) return "libpelmix.so";
-  return (self.parent_path() / ".." / "lib" / "libpelmix.so").lexically_normal().string();
 }
 
 void PrintHelp(std::ostream& out) {

@@ -29,6 +29,13 @@ uvo::result_t ModuleHost::CreateServiceFactory(
                                  out->ReceiveVoid());
 }
 
+std::string DefaultModulePath() {
+  std::error_code error;
+  const std::filesystem::path self = std::filesystem::read_symlink("/proc/self/exe", error);
+  if (error) return "libpelmix.so";
+  return (self.parent_path() / ".." / "lib" / "libpelmix.so").lexically_normal().string();
+}
+
 std::string DefaultKnowledgeBase() {
   std::error_code error;
   const std::filesystem::path self = std::filesystem::read_symlink("/proc/self/exe", error);

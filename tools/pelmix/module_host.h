@@ -29,6 +29,9 @@ class ModuleHost {
   std::unique_ptr<host::Module> module_;
 };
 
+// The module next to the binary's folder: ../lib/libpelmix.so.
+std::string DefaultModulePath();
+
 // The knowledge base the commands use without --kb: example.kb next to the binary's folder.
 std::string DefaultKnowledgeBase();
 

@@ -44,54 +44,45 @@ std::optional<std::vector<std::string>> FeaturesOf(const std::vector<host::Trace
 
 }  // namespace
 
-PageResult ScanPage(IHttpSessionFactory& sessions, const PageInput& input,
-                    const PageScanOptions& options) {
-  PageResult result;
-  if (!input.error.empty()) {
-    result.error = input.error;
-    return result;
-  }
-  host::Tracer::ThreadCapture capture(options.features ? kVerdictLevel : kFailureLevel);
-
+PageJudgement::PageJudgement(IHttpSessionFactory& sessions, const std::string& url,
+                             const PageScanOptions& options)
+    : capture_(options.features ? kVerdictLevel : kFailureLevel), features_(options.features) {
   const SessionSettings settings{options.level};
   const SessionParam asked[] = {{kTraceFeaturesParameter, "1"}};
   const SessionParamList params{asked, asked + (options.features ? 1 : 0)};
-  uvo::Ptr<IHttpSession> session;
-  uvo::result_t code =
-      sessions.CreateSession(&settings, input.url.c_str(), &params, session.Receive());
+  const uvo::result_t code =
+      sessions.CreateSession(&settings, url.c_str(), &params, session_.Receive());
   if (code < 0) {
-    result.error = Failure("no session", code, capture.Take());
-    return result;
+    error_ = Failure("no session", code, capture_.Take());
+    session_ = nullptr;
   }
+}
 
-  uvo::result_t appendFailure = 0;
-  std::string readError;
-  const bool read = ReadChunks(
-      {options.chunk, input.path},
-      [&](std::string_view chunk) {
-        if (appendFailure < 0) return;
-        const uvo::result_t appended =
-            session->AppendHtml({chunk.data(), chunk.data() + chunk.size()});
-        if (appended < 0) appendFailure = appended;
-      },
-      &readError);
-  if (!read) {
-    result.error = readError;
-    return result;
+bool PageJudgement::Append(std::string_view chunk) {
+  if (!error_.empty()) return false;
+  const uvo::result_t appended = session_->AppendHtml({chunk.data(), chunk.data() + chunk.size()});
+  if (appended < 0) {
+    error_ = Failure("AppendHtml", appended, capture_.Take());
+    return false;
   }
-  if (appendFailure < 0) {
-    result.error = Failure("AppendHtml", appendFailure, capture.Take());
-    return result;
-  }
+  return true;
+}
 
+PageResult PageJudgement::Finish() {
+  PageResult result;
+  if (!error_.empty()) {
+    result.error = error_;
+    return result;
+  }
   Verdict verdict{};
   HeuristicVerdictInfo info{};
-  if ((code = session->GetVerdict(&verdict)) < 0) {
-    result.error = Failure("GetVerdict", code, capture.Take());
+  uvo::result_t code;
+  if ((code = session_->GetVerdict(&verdict)) < 0) {
+    result.error = Failure("GetVerdict", code, capture_.Take());
     return result;
   }
-  if ((code = session->GetHeuristicVerdictInfo(&info)) < 0) {
-    result.error = Failure("GetHeuristicVerdictInfo", code, capture.Take());
+  if ((code = session_->GetHeuristicVerdictInfo(&info)) < 0) {
+    result.error = Failure("GetHeuristicVerdictInfo", code, capture_.Take());
     return result;
   }
   result.phishing = verdict.phishingDetected;
@@ -100,8 +91,29 @@ PageResult ScanPage(IHttpSessionFactory& sessions, const PageInput& input,
   result.target = std::string(info.target.view());
   result.confidence = info.confidence;
   result.dbstamp = info.dbstamp;
-  if (options.features) result.features = FeaturesOf(capture.Take());
+  if (features_) result.features = FeaturesOf(capture_.Take());
   return result;
+}
+
+PageResult ScanPage(IHttpSessionFactory& sessions, const PageInput& input,
+                    const PageScanOptions& options) {
+  if (!input.error.empty()) {
+    PageResult result;
+    result.error = input.error;
+    return result;
+  }
+  PageJudgement judgement(sessions, input.url, options);
+  if (judgement.Failed()) return judgement.Finish();
+  std::string readError;
+  const bool read = ReadChunks(
+      {options.chunk, input.path}, [&](std::string_view chunk) { judgement.Append(chunk); },
+      &readError);
+  if (!read) {
+    PageResult result;
+    result.error = readError;
+    return result;
+  }
+  return judgement.Finish();
 }
 
 }  // namespace pelmix::cli

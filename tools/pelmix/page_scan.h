@@ -7,10 +7,12 @@
 #include <cstddef>
 #include <cstdint>
 #include <optional>
+#include <string_view>
 #include <string>
 #include <vector>
 
 #include "framework/uvo/anti_phishing.h"
+#include "host/tracer.h"
 
 namespace pelmix::cli {
 
@@ -36,6 +38,30 @@ struct PageResult {
   std::int64_t dbstamp = 0;
   // The vector the model judged, as the module wrote it (%.9g each); none for a trusted page.
   std::optional<std::vector<std::string>> features;
+};
+
+// One page judged as its bytes arrive, for hosts that do not hold the page whole (a file read
+// in chunks, an HTTP body as it is received). All calls must come from the thread that made
+// it: the session's trace lines are captured on that thread.
+class PageJudgement {
+ public:
+  PageJudgement(cf::services::anti_phishing::IHttpSessionFactory& sessions,
+                const std::string& url, const PageScanOptions& options);
+  PageJudgement(const PageJudgement&) = delete;
+  PageJudgement& operator=(const PageJudgement&) = delete;
+
+  // Hands the next bytes to the session; false once the session has failed (later chunks
+  // are dropped, Finish() reports why).
+  bool Append(std::string_view chunk);
+  bool Failed() const { return !error_.empty(); }
+  // The verdict, or the first failure. Call once, after the last chunk.
+  PageResult Finish();
+
+ private:
+  host::Tracer::ThreadCapture capture_;
+  bool features_;
+  uvo::Ptr<cf::services::anti_phishing::IHttpSession> session_;
+  std::string error_;  // the first failure, if any
 };
 
 PageResult ScanPage(cf::services::anti_phishing::IHttpSessionFactory& sessions,

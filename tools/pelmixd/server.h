@@ -1,0 +1,43 @@
+// pelmixd's HTTP front: the routes, each request judged through a session of the service
+// current when the request began, JSON answers and JSON errors, limits and timeouts.
+#pragma once
+
+#include <memory>
+#include <string>
+
+#include <httplib.h>
+
+#include "tools/pelmixd/metrics.h"
+#include "tools/pelmixd/options.h"
+#include "tools/pelmixd/service_holder.h"
+
+namespace pelmix::pelmixd {
+
+// Accepted connections that may wait for a worker, per worker thread.
+inline constexpr std::size_t kQueuedConnectionsPerThread = 64;
+
+class Server {
+ public:
+  Server(const Options& options, ServiceHolder& services, Metrics& metrics);
+
+  // Binds the listening socket; returns false and fills `error` when it cannot.
+  bool Bind(std::string* error);
+  int Port() const { return port_; }
+  // Serves until Stop(); requests already accepted are answered before it returns.
+  bool Run();
+  void Stop();
+
+ private:
+  void Web(const httplib::Request& request, httplib::Response& response,
+           const httplib::ContentReader& reader);
+  void White(const httplib::Request& request, httplib::Response& response);
+  void Health(const httplib::Request& request, httplib::Response& response);
+
+  const Options options_;
+  ServiceHolder& services_;
+  Metrics& metrics_;
+  httplib::Server http_;
+  int port_ = -1;
+};
+
+}  // namespace pelmix::pelmixd
