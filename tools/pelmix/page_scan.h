@@ -7,8 +7,8 @@
 #include <cstddef>
 #include <cstdint>
 #include <optional>
-#include <string_view>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "framework/uvo/anti_phishing.h"
@@ -45,8 +45,8 @@ struct PageResult {
 // it: the session's trace lines are captured on that thread.
 class PageJudgement {
  public:
-  PageJudgement(cf::services::anti_phishing::IHttpSessionFactory& sessions,
-                const std::string& url, const PageScanOptions& options);
+  PageJudgement(cf::services::anti_phishing::IHttpSessionFactory& sessions, const std::string& url,
+                const PageScanOptions& options);
   PageJudgement(const PageJudgement&) = delete;
   PageJudgement& operator=(const PageJudgement&) = delete;
 

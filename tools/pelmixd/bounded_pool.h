@@ -4,6 +4,8 @@
 // than in our memory.
 #pragma once
 
+#include <httplib.h>
+
 #include <condition_variable>
 #include <cstddef>
 #include <deque>
@@ -11,8 +13,6 @@
 #include <mutex>
 #include <thread>
 #include <vector>
-
-#include <httplib.h>
 
 namespace pelmix::pelmixd {
 

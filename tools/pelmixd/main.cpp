@@ -88,8 +88,7 @@ int Run(int argc, char** argv) {
         host->Host().tracer->Clear();
         if (reloadError.empty()) {
           Published(services, metrics);
-          Log("reloaded " + options.kb + ", stamp " +
-              std::to_string(services.Current()->dbstamp));
+          Log("reloaded " + options.kb + ", stamp " + std::to_string(services.Current()->dbstamp));
         } else {
           Log("reload failed, still serving the previous knowledge base: " + reloadError);
         }

@@ -45,7 +45,7 @@ class Metrics {
   std::map<std::pair<Endpoint, int>, std::uint64_t> requests_;
   std::array<Histogram, kEndpointCount> latency_{};
   std::array<std::array<std::uint64_t, 2>, kEndpointCount> verdicts_{};  // clean, phishing
-  std::uint64_t reloads_[2] = {0, 0};                                     // failed, loaded
+  std::uint64_t reloads_[2] = {0, 0};                                    // failed, loaded
   std::int64_t dbstamp_ = 0;
   double loadedAt_ = 0;
   std::atomic<std::int64_t> inFlight_{0};

@@ -48,18 +48,48 @@ bool LevelOf(const httplib::Request& request, int fallback, int& level) {
   return true;
 }
 
+// The HTTP layer reads a length it cannot parse as zero and takes the first of several, so
+// the rest of such a body would be read as the next request. Those requests are refused.
+const char* FramingError(const httplib::Request& request) {
+  const std::size_t lengths = request.get_header_value_count("Content-Length");
+  if (lengths == 0) return nullptr;
+  if (request.has_header("Transfer-Encoding")) {
+    return "a request has either a Content-Length or a Transfer-Encoding, not both";
+  }
+  const std::string first = request.get_header_value("Content-Length");
+  for (std::size_t i = 0; i < lengths; ++i) {
+    const std::string value = request.get_header_value("Content-Length", i);
+    if (value.empty() || value.size() > 18 ||
+        value.find_first_not_of("0123456789") != std::string::npos) {
+      return "Content-Length is not a number";
+    }
+    if (value != first) return "conflicting Content-Length headers";
+  }
+  return nullptr;
+}
+
 const char* StatusText(int status) {
   switch (status) {
-    case 400: return "bad request";
-    case 404: return "no such endpoint";
-    case 405: return "method not allowed";
-    case 408: return "the request took too long";
-    case 413: return "the body is larger than the limit";
-    case 414: return "the request line is too long";
-    case 415: return "unsupported content type";
-    case 416: return "range not satisfiable";
-    case 431: return "the request headers are too large";
-    default: return status < 500 ? "the request was refused" : "internal error";
+    case 400:
+      return "bad request";
+    case 404:
+      return "no such endpoint";
+    case 405:
+      return "method not allowed";
+    case 408:
+      return "the request took too long";
+    case 413:
+      return "the body is larger than the limit";
+    case 414:
+      return "the request line is too long";
+    case 415:
+      return "unsupported content type";
+    case 416:
+      return "range not satisfiable";
+    case 431:
+      return "the request headers are too large";
+    default:
+      return status < 500 ? "the request was refused" : "internal error";
   }
 }
 
@@ -77,11 +107,17 @@ Server::Server(const Options& options, ServiceHolder& services, Metrics& metrics
   http_.set_keep_alive_timeout(options_.keepAliveTimeout);
   http_.set_keep_alive_max_count(options_.keepAliveRequests);
 
-  http_.set_pre_routing_handler([this](const httplib::Request&, httplib::Response&) {
-    requestStart = Clock::now();
-    metrics_.EnterRequest();
-    return httplib::Server::HandlerResponse::Unhandled;
-  });
+  http_.set_pre_routing_handler(
+      [this](const httplib::Request& request, httplib::Response& response) {
+        requestStart = Clock::now();
+        metrics_.EnterRequest();
+        if (const char* error = FramingError(request)) {
+          response.set_header("Connection", "close");
+          Fail(response, 400, error);
+          return httplib::Server::HandlerResponse::Handled;
+        }
+        return httplib::Server::HandlerResponse::Unhandled;
+      });
   http_.set_logger([this](const httplib::Request& request, const httplib::Response& response) {
     double seconds = 0;
     if (requestStart) {
@@ -95,15 +131,12 @@ Server::Server(const Options& options, ServiceHolder& services, Metrics& metrics
   http_.set_error_handler([](const httplib::Request&, httplib::Response& response) {
     if (response.body.empty()) Fail(response, response.status, StatusText(response.status));
   });
-  http_.set_exception_handler(
-      [](const httplib::Request&, httplib::Response& response, std::exception_ptr) {
-        Fail(response, 500, "internal error");
-      });
+  http_.set_exception_handler([](const httplib::Request&, httplib::Response& response,
+                                 std::exception_ptr) { Fail(response, 500, "internal error"); });
 
-  http_.Post("/v1/web", [this](const httplib::Request& request, httplib::Response& response,
-                               const httplib::ContentReader& reader) {
-    Web(request, response, reader);
-  });
+  http_.Post("/v1/web",
+             [this](const httplib::Request& request, httplib::Response& response,
+                    const httplib::ContentReader& reader) { Web(request, response, reader); });
   http_.Get("/v1/white", [this](const httplib::Request& request, httplib::Response& response) {
     White(request, response);
   });
@@ -167,8 +200,8 @@ void Server::Web(const httplib::Request& request, httplib::Response& response,
     return true;
   });
   if (tooLarge || response.status == 413) {
-    return refuse(413, "the body is larger than the limit of " +
-                           std::to_string(options_.maxBody) + " bytes");
+    return refuse(
+        413, "the body is larger than the limit of " + std::to_string(options_.maxBody) + " bytes");
   }
   if (!read) return refuse(400, "the body could not be read");
   const cli::PageResult result = judgement.Finish();
@@ -202,9 +235,9 @@ void Server::White(const httplib::Request& request, httplib::Response& response)
 
 void Server::Health(const httplib::Request&, httplib::Response& response) {
   const std::shared_ptr<const LoadedService> service = services_.Current();
-  const auto loaded = std::chrono::duration_cast<std::chrono::seconds>(
-                          service->loadedAt.time_since_epoch())
-                          .count();
+  const auto loaded =
+      std::chrono::duration_cast<std::chrono::seconds>(service->loadedAt.time_since_epoch())
+          .count();
   Answer(response, 200,
          json{{"status", "ok"},
               {"kb", service->kbPath},

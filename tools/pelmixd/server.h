@@ -2,10 +2,10 @@
 // current when the request began, JSON answers and JSON errors, limits and timeouts.
 #pragma once
 
+#include <httplib.h>
+
 #include <memory>
 #include <string>
-
-#include <httplib.h>
 
 #include "tools/pelmixd/metrics.h"
 #include "tools/pelmixd/options.h"
