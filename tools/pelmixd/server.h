@@ -16,6 +16,9 @@ namespace pelmix::pelmixd {
 // Accepted connections that may wait for a worker, per worker thread.
 inline constexpr std::size_t kQueuedConnectionsPerThread = 64;
 
+// Connections the kernel may hold for us before they are accepted.
+inline constexpr int kListenBacklog = 1024;
+
 class Server {
  public:
   Server(const Options& options, ServiceHolder& services, Metrics& metrics);
@@ -38,6 +41,7 @@ class Server {
   Metrics& metrics_;
   httplib::Server http_;
   int port_ = -1;
+  int listener_ = -1;
 };
 
 }  // namespace pelmix::pelmixd
