@@ -6,6 +6,7 @@
 #include <unistd.h>
 
 #include <fstream>
+#include <iterator>
 #include <string>
 #include <vector>
 
@@ -107,6 +108,21 @@ TEST(PelmixdOptions, BadCommandLines) {
   Options options;
   EXPECT_EQ(ParseOptions({"--help"}, options), "");
   EXPECT_TRUE(options.help);
+}
+
+}  // namespace
+
+namespace {
+
+// The sample configuration shipped beside the unit file is one the daemon accepts.
+TEST(PelmixdOptions, ShippedSampleConfigParses) {
+  std::ifstream in(std::string(PELMIX_SOURCE_DIR) + "/tools/pelmixd/systemd/pelmixd.conf");
+  ASSERT_TRUE(in);
+  const std::string text((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());
+  pelmix::pelmixd::Options options;
+  EXPECT_EQ(pelmix::pelmixd::ApplyConfigText(text, options), "");
+  EXPECT_EQ(options.host, "127.0.0.1");
+  EXPECT_EQ(options.port, 8639);
 }
 
 }  // namespace
