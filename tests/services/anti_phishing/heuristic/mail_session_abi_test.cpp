@@ -3,6 +3,7 @@
 // from the features trace line), attachments by name and type, the link budget, white links,
 // images, null arguments, failing host streams and known phishing links.
 #include <gtest/gtest.h>
+#include <zlib.h>
 
 #include <sstream>
 #include <string>
@@ -54,6 +55,18 @@ class FailingStream final : public uvo::ObjectImpl<FailingStream, uvo::IStream> 
 
 uvo::Ptr<pelmix::host::MemoryStream> Stream(const std::string& bytes) {
   return pelmix::host::MemoryStream::Create(bytes);
+}
+
+// A one-page PDF whose content stream (compressed, as writers store it) is `content`.
+std::string Pdf(const std::string& content) {
+  uLongf size = compressBound(content.size());
+  std::string packed(size, '\0');
+  compress2(reinterpret_cast<Bytef*>(packed.data()), &size,
+            reinterpret_cast<const Bytef*>(content.data()), content.size(), 9);
+  packed.resize(size);
+  return "%PDF-1.4\n4 0 obj\n<< /Length " + std::to_string(size) +
+         " /Filter /FlateDecode >>\nstream\n" + packed + "\nendstream\nendobj\ntrailer\n<< >>\n"
+         "%%EOF\n";
 }
 
 class MailSessionAbi : public ::testing::Test {
@@ -194,16 +207,14 @@ TEST_F(MailSessionAbi, PartsAreSniffedAndClassified) {
             0);
   EXPECT_TRUE(anchorsIn(exact.Get()));
   // A PDF by its name and by its type: its text reaches the extractor.
-  const std::string pdf =
-      "%PDF-1.4\n1 0 obj\n<< /Length 44 >>\nstream\nBT /F1 12 Tf (Your PayPal account) Tj ET\n"
-      "endstream\nendobj\ntrailer\n<< >>\n%%EOF\n";
+  const std::string pdf = Pdf("BT\n/F1 12 Tf\n(Your PayPal account) Tj\nET\n");
   for (const auto& [name, type] : {std::pair{"report.pdf", "application/octet-stream"},
                                    std::pair{"x", "application/pdf"}}) {
     auto s = Open();
     ASSERT_EQ(s->AddAttachment(name, type, Stream(pdf).Get()), 0);
     HeuristicVerdictInfo info{};
     ASSERT_EQ(s->GetHeuristicVerdictInfo(&info), 0);
-    EXPECT_EQ(info.target.view(), "PayPal") << name;
+    EXPECT_EQ(std::string(info.target.view()).rfind("PayPal", 0), 0u) << name;
   }
 }
 
