@@ -1,7 +1,6 @@
 #include "services/anti_phishing/heuristic/source/anti_phishing.h"
 
 #include <atomic>
-#include <boost/format.hpp>
 #include <new>
 #include <stdexcept>
 
@@ -37,8 +36,11 @@ platform::CriticalSection& ConstructionLock() {
 
 std::atomic<std::uint32_t> sessionCounter{0};
 
+// "%s %u\t", composed by hand: Boost.Format parses through the locale's ctype facet, whose
+// lazily filled narrow cache libstdc++ writes without a lock, and sessions are created on
+// many threads at once.
 std::string SessionPrefix(const char* kind) {
-  return (boost::format("%s %u\t") % kind % NextSessionNumber()).str();
+  return std::string(kind) + ' ' + std::to_string(NextSessionNumber()) + '\t';
 }
 
 }  // namespace
@@ -56,9 +58,8 @@ int GetConfidence(std::int32_t protectionLevel) {
     case 3:
       return 0;
     default:
-      throw std::runtime_error(
-          (boost::format("GetConfidence: unexpected protection level value - %d") % protectionLevel)
-              .str());
+      throw std::runtime_error("GetConfidence: unexpected protection level value - " +
+                               std::to_string(protectionLevel));
   }
 }
 
