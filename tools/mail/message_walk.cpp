@@ -103,6 +103,10 @@ class Walker {
       : sink_(sink), limits_(limits), report_(report) {}
 
   void Message(GMimeMessage* message, int depth) {
+    if (depth > limits_.maxDepth) {
+      Hit(Limit::kDepth);
+      return;
+    }
     if (const char* subject = g_mime_message_get_subject(message)) {
       std::string_view text(subject);
       if (text.size() > limits_.maxSubjectBytes) {
@@ -283,7 +287,9 @@ WalkReport WalkMessage(const MessageBuffer& message, MessageSink& sink, const Ma
   g_mime_parser_options_set_fallback_charsets(options.get(), kFallbackCharsets);
   Ref<GMimeMessage> parsed(g_mime_parser_construct_message(parser.get(), options.get()));
   if (parsed.get() == nullptr) {
-    report.error = cut.length == 0 ? "empty message" : "no message header found";
+    report.error = message.size() == 0 ? "empty message"
+                   : cut.length == 0   ? "the first header line is over the structure budget"
+                                       : "no message header found";
     return report;
   }
   report.readable = true;
