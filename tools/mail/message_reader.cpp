@@ -39,6 +39,8 @@ ReadResult ReadMessages(int fd, const MessageSplitter::MessageFn& onMessage,
     head.append(bytes);
     if (head.size() >= 5) start();
   }
+  // Nothing read before a failure: no message at all, not an empty one.
+  if (!result.ok && !splitter && head.empty()) return result;
   if (!splitter) start();
   // A message cut short by a read error is still delivered: whatever arrived is scanned.
   splitter->Finish();

@@ -168,8 +168,10 @@ TEST_F(MessageReader, ChoosesMboxByTheFirstLine) {
 TEST_F(MessageReader, ReportsAReadError) {
   const int fd = ::open(dir_.c_str(), O_RDONLY | O_DIRECTORY);  // read() gives EISDIR
   ASSERT_GE(fd, 0);
-  const auto result = pelmix::mail::ReadMessages(fd, [](MessageBuffer&) {});
+  std::size_t seen = 0;
+  const auto result = pelmix::mail::ReadMessages(fd, [&](MessageBuffer&) { ++seen; });
   ::close(fd);
+  EXPECT_EQ(seen, 0u);
   EXPECT_FALSE(result.ok);
   EXPECT_FALSE(result.error.empty());
 }
