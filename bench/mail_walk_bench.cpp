@@ -47,7 +47,7 @@ std::string Base64(const std::string& in) {
   return out + "\r\n";
 }
 
-// About 60 KB: a newsletter with plain and HTML alternatives (Latin-1, quoted-printable), an
+// About 48 KB: a newsletter with plain and HTML alternatives (Latin-1, quoted-printable), an
 // inline logo and a small PDF attachment, the shape of most bulk mail.
 const std::string& Newsletter() {
   static const std::string message = [] {
