@@ -18,6 +18,9 @@ struct CorpusCase {
   std::vector<std::string_view> warnings;
 };
 
+// Names the case by its file in test listings.
+void PrintTo(const CorpusCase& c, std::ostream* out) { *out << c.file; }
+
 class CorpusWalk : public ::testing::TestWithParam<CorpusCase> {};
 
 TEST_P(CorpusWalk, HandsOverWhatASessionTakes) {
