@@ -14,8 +14,8 @@ inline constexpr std::size_t kMaxMessageBytes = 32u << 20;
 
 // GMime builds an object per header, parameter and part, at a few hundred bytes to over a
 // kilobyte each, so a small message can cost gigabytes. Before parsing, the message is cut at
-// the first line where one of these runs out (header-like lines, their bytes and ';'
-// separators, and lines starting with "--", which bound the number of parts).
+// the first line where one of these runs out (header lines, their bytes and ';' separators,
+// and delimiter lines, which bound the number of parts; see structure_budget.h).
 inline constexpr std::size_t kMaxHeaderLines = 20000;
 inline constexpr std::size_t kMaxHeaderBytes = 2u << 20;
 inline constexpr std::size_t kMaxHeaderParams = 20000;

@@ -47,11 +47,19 @@ TEST(StructureBudget, CutsAtTheLineWhereABudgetRunsOut) {
       {"header bytes", "A:\nB: 2\n", &MailLimits::maxHeaderBytes, Limit::kHeaderBytes, 3},
       {"parameters", "C-T: a/b; a=1; b=2\nC-D: x; c=3; d=4\n", &MailLimits::maxHeaderParams,
        Limit::kHeaderParams, 19},
-      {"delimiters", "A: 1\n\n--b\nX: 1\n\n--b\n\n--b\n\n--b--\n", &MailLimits::maxDelimiterLines,
-       Limit::kDelimiterLines, 26},
-      // Headers of an embedded message start after a blank line and count as well.
-      {"embedded headers", "A: 1\n\nB: 2\nC: 3\nD: 4\n", &MailLimits::maxHeaderLines,
-       Limit::kHeaderLines, 16},
+      {"delimiters",
+       "Content-Type: multipart/mixed; boundary=b\n\n--b\nX: 1\n\n--b\n\n--b\n\n--b--\n",
+       &MailLimits::maxDelimiterLines, Limit::kDelimiterLines, 63},
+      // A boundary declared on a continuation line, quoted, with a blank in it.
+      {"folded boundary",
+       "Content-Type: multipart/mixed;\n boundary=\"b b\"\n\n--b b\n\n--b b\n\n--b b\n\n--b b--\n",
+       &MailLimits::maxDelimiterLines, Limit::kDelimiterLines, 69},
+      // Headers of an embedded message start after the blank line of its part.
+      {"embedded headers", "Content-Type: message/rfc822\n\nB: 2\nC: 3\nD: 4\n",
+       &MailLimits::maxHeaderLines, Limit::kHeaderLines, 40},
+      // Part headers follow a delimiter.
+      {"part headers", "Content-Type: multipart/mixed; boundary=q\n\n--q\nA: 1\nB: 2\nC: 3\n",
+       &MailLimits::maxHeaderLines, Limit::kHeaderLines, 57},
   };
   for (const StructureCase& c : cases) {
     MailLimits limits;
@@ -60,15 +68,47 @@ TEST(StructureBudget, CutsAtTheLineWhereABudgetRunsOut) {
     EXPECT_EQ(cut.limit, pelmix::mail::Bit(c.limit)) << c.what;
     EXPECT_EQ(cut.length, c.cutAt) << c.what;
   }
-  // Body text is not headers: prose, base64 and "key: value" lines after a body line.
+  // Body text is not structure: "key: value" lines and "--" lines in a body, and after a
+  // closing delimiter, do not count.
   MailLimits small;
   small.maxHeaderLines = 3;
   small.maxHeaderParams = 3;
-  const std::string body =
-      "A: 1\n\nDear customer: hello\nx: 1\ny: 2\nz: 3\nw: 4\n" + Repeat("QUJD;REVG:\n", 10);
-  const auto cut = MeasureStructure(body, small);
-  EXPECT_EQ(cut.limit, 0u);
-  EXPECT_EQ(cut.length, body.size());
+  small.maxDelimiterLines = 2;
+  const std::string bodies[] = {
+      "A: 1\n\nx: 1\ny: 2\nz: 3\nw: 4\n--a\n--b\n" + Repeat("QUJD;REVG:\n", 10),
+      "A: 1\n\nDear customer: hello\n\nx: 1\ny: 2\nz: 3\nw: 4\n",
+      "Content-Type: multipart/mixed; boundary=q\n\n--q\n\nx: 1\ny: 2\nz: 3\nw: 4\n--q--\n"
+      "a: 1\nb: 2\n--q-x\n",
+  };
+  for (const std::string& body : bodies) {
+    const auto cut = MeasureStructure(body, small);
+    EXPECT_EQ(cut.limit, 0u) << body;
+    EXPECT_EQ(cut.length, body.size()) << body;
+  }
+  // A boundary too long to remember makes every "--" line count.
+  const std::string longBoundary =
+      "Content-Type: multipart/mixed; boundary=" + std::string(300, 'L') +
+      "\n\n--x\n\n--y\n\n--z\n";
+  EXPECT_EQ(MeasureStructure(longBoundary, small).limit, pelmix::mail::Bit(Limit::kDelimiterLines));
+}
+
+// Text that only looks like structure cannot make the budget cut off what follows it.
+TEST(HostileMail, LookalikeStructureInABodyHidesNothing) {
+  const std::string tail = "\nthe end: http://tail.example/\n";
+  const std::string messages[] = {
+      "Subject: x\n\nhttp:" + std::string(3 << 20, 'q') + tail,
+      "Subject: x\n\n" + Repeat("a: b;c;d\n", 30000) + tail,
+      "Subject: x\n\n" + Repeat("--x\na: b\n", 30000) + tail,
+      "Content-Type: multipart/mixed; boundary=q\n\n--q\n\n" + Repeat("--z\nk: v\n", 30000) + tail +
+          "--q--\n",
+  };
+  for (const std::string& message : messages) {
+    RecordingSink sink;
+    const WalkReport report = WalkMessage(message, sink);
+    EXPECT_EQ(report.limits, 0u) << message.substr(0, 80);
+    ASSERT_FALSE(sink.events.empty());
+    EXPECT_EQ(sink.events.back(), "U http://tail.example/") << message.substr(0, 80);
+  }
 }
 
 // Messages that would make GMime build millions of objects are cut before it parses them;
