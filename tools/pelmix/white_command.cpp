@@ -13,11 +13,16 @@ namespace {
 using cf::services::anti_phishing::IAntiPhishingService;
 using cf::services::anti_phishing::IAntiPhishingServiceFactory;
 
+// The installed default (PREFIX/share/pelmix/default.kb beside PREFIX/bin), else the one the
+// build tree keeps beside bin/.
 std::string DefaultKnowledgeBase() {
   std::error_code error;
   const std::filesystem::path self = std::filesystem::read_symlink("/proc/self/exe", error);
-  if (error) return "example.kb";
-  return (self.parent_path() / ".." / "example.kb").lexically_normal().string();
+  if (error) return PELMIX_DEFAULT_KB_NAME;
+  const std::filesystem::path root = self.parent_path().parent_path();
+  const std::filesystem::path installed = root / "share" / "pelmix" / "default.kb";
+  if (std::filesystem::is_regular_file(installed, error)) return installed.string();
+  return (root / PELMIX_DEFAULT_KB_NAME).string();
 }
 
 // The last failure line the module traced, if any.
@@ -80,8 +85,10 @@ int RunWhite(const std::vector<std::string>& args, const GlobalOptions& options)
 
 }  // namespace
 
-PELMIX_COMMAND({"white", "[--kb FILE] DOMAIN...",
-                "ask the module whether each DOMAIN is white (default: build/example.kb)",
-                RunWhite})
+PELMIX_COMMAND(
+    {"white", "[--kb FILE] DOMAIN...",
+     "ask the module whether each DOMAIN is white (default: the installed or built default "
+     "knowledge base)",
+     RunWhite})
 
 }  // namespace pelmix::cli
