@@ -13,18 +13,6 @@ namespace {
 using cf::services::anti_phishing::IAntiPhishingService;
 using cf::services::anti_phishing::IAntiPhishingServiceFactory;
 
-// The installed default (PREFIX/share/pelmix/default.kb beside PREFIX/bin), else the one the
-// build tree keeps beside bin/.
-std::string DefaultKnowledgeBase() {
-  std::error_code error;
-  const std::filesystem::path self = std::filesystem::read_symlink("/proc/self/exe", error);
-  if (error) return PELMIX_DEFAULT_KB_NAME;
-  const std::filesystem::path root = self.parent_path().parent_path();
-  const std::filesystem::path installed = root / "share" / "pelmix" / "default.kb";
-  if (std::filesystem::is_regular_file(installed, error)) return installed.string();
-  return (root / PELMIX_DEFAULT_KB_NAME).string();
-}
-
 // The last failure line the module traced, if any.
 std::string LastFailureLine(const host::Tracer& tracer) {
   std::string last;
