@@ -21,6 +21,8 @@ class JsonLine {
   JsonLine& Int(std::string_view key, std::int64_t value);
   JsonLine& Bool(std::string_view key, bool value);
   JsonLine& Strings(std::string_view key, const std::vector<std::string_view>& values);  // array
+  // `json` written as it is: a number, an array, null ...
+  JsonLine& Raw(std::string_view key, std::string_view json);
   // Writes the object and a line feed.
   void Write(std::ostream& out);
 

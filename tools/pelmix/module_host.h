@@ -29,6 +29,10 @@ class ModuleHost {
   std::unique_ptr<host::Module> module_;
 };
 
+// The knowledge base the commands use without --kb: the installed default
+// (PREFIX/share/pelmix/default.kb beside PREFIX/bin), else the build tree's, beside bin/.
+std::string DefaultKnowledgeBase();
+
 // "0x80000043 (Not implemented)"
 std::string DescribeResult(uvo::result_t code);
 
