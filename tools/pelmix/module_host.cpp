@@ -41,4 +41,14 @@ std::string DescribeResult(uvo::result_t code) {
          uvo::ToUtf8(uvo::ResultMessage(code)) + ")";
 }
 
+std::string DefaultKnowledgeBase() {
+  std::error_code error;
+  const std::filesystem::path self = std::filesystem::read_symlink("/proc/self/exe", error);
+  if (error) return PELMIX_DEFAULT_KB_NAME;
+  const std::filesystem::path root = self.parent_path().parent_path();
+  const std::filesystem::path installed = root / "share" / "pelmix" / "default.kb";
+  if (std::filesystem::is_regular_file(installed, error)) return installed.string();
+  return (root / PELMIX_DEFAULT_KB_NAME).string();
+}
+
 }  // namespace pelmix::cli
