@@ -50,12 +50,6 @@ JsonLine& JsonLine::Bool(std::string_view key, bool value) {
   return *this;
 }
 
-JsonLine& JsonLine::Raw(std::string_view key, std::string_view json) {
-  Key(key);
-  text_.append(json);
-  return *this;
-}
-
 JsonLine& JsonLine::Strings(std::string_view key, const std::vector<std::string_view>& values) {
   Key(key);
   text_ += '[';

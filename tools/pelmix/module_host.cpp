@@ -29,13 +29,6 @@ uvo::result_t ModuleHost::CreateServiceFactory(
                                  out->ReceiveVoid());
 }
 
-std::string DefaultKnowledgeBase() {
-  std::error_code error;
-  const std::filesystem::path self = std::filesystem::read_symlink("/proc/self/exe", error);
-  if (error) return "example.kb";
-  return (self.parent_path() / ".." / "example.kb").lexically_normal().string();
-}
-
 std::string DescribeResult(uvo::result_t code) {
   return uvo::HexCode(static_cast<std::uint32_t>(code)) + " (" +
          uvo::ToUtf8(uvo::ResultMessage(code)) + ")";
