@@ -38,15 +38,15 @@ JsonLine& JsonLine::Int(std::string_view key, std::int64_t value) {
   return *this;
 }
 
-JsonLine& JsonLine::Bool(std::string_view key, bool value) {
+JsonLine& JsonLine::Raw(std::string_view key, std::string_view json) {
   Key(key);
-  text_.append(value ? std::string_view("true") : std::string_view("false"));
+  text_ += json;
   return *this;
 }
 
-JsonLine& JsonLine::Raw(std::string_view key, std::string_view json) {
+JsonLine& JsonLine::Bool(std::string_view key, bool value) {
   Key(key);
-  text_.append(json);
+  text_.append(value ? std::string_view("true") : std::string_view("false"));
   return *this;
 }
 

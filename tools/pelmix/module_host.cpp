@@ -29,16 +29,19 @@ uvo::result_t ModuleHost::CreateServiceFactory(
                                  out->ReceiveVoid());
 }
 
-std::string DefaultKnowledgeBase() {
-  std::error_code error;
-  const std::filesystem::path self = std::filesystem::read_symlink("/proc/self/exe", error);
-  if (error) return "example.kb";
-  return (self.parent_path() / ".." / "example.kb").lexically_normal().string();
-}
-
 std::string DescribeResult(uvo::result_t code) {
   return uvo::HexCode(static_cast<std::uint32_t>(code)) + " (" +
          uvo::ToUtf8(uvo::ResultMessage(code)) + ")";
+}
+
+std::string DefaultKnowledgeBase() {
+  std::error_code error;
+  const std::filesystem::path self = std::filesystem::read_symlink("/proc/self/exe", error);
+  if (error) return PELMIX_DEFAULT_KB_NAME;
+  const std::filesystem::path root = self.parent_path().parent_path();
+  const std::filesystem::path installed = root / "share" / "pelmix" / "default.kb";
+  if (std::filesystem::is_regular_file(installed, error)) return installed.string();
+  return (root / PELMIX_DEFAULT_KB_NAME).string();
 }
 
 }  // namespace pelmix::cli

@@ -29,7 +29,8 @@ class ModuleHost {
   std::unique_ptr<host::Module> module_;
 };
 
-// The knowledge base the commands use without --kb: example.kb next to the binary's folder.
+// The knowledge base the commands use without --kb: the installed default
+// (PREFIX/share/pelmix/default.kb beside PREFIX/bin), else the build tree's, beside bin/.
 std::string DefaultKnowledgeBase();
 
 // "0x80000043 (Not implemented)"

@@ -73,8 +73,10 @@ int RunWhite(const std::vector<std::string>& args, const GlobalOptions& options)
 
 }  // namespace
 
-PELMIX_COMMAND({"white", "[--kb FILE] DOMAIN...",
-                "ask the module whether each DOMAIN is white (default: build/example.kb)",
-                RunWhite})
+PELMIX_COMMAND(
+    {"white", "[--kb FILE] DOMAIN...",
+     "ask the module whether each DOMAIN is white (default: the installed or built default "
+     "knowledge base)",
+     RunWhite})
 
 }  // namespace pelmix::cli
