@@ -6,7 +6,7 @@ Decrunch::Decrunch(Handler& receiver, bool nested)
     : handler_(receiver, nested ? 1 : 0), tokenizer_(handler_) {}
 
 Decrunch::Decrunch(Handler& receiver, NestedIn parent)
-    : handler_(receiver, parent.parentDepth + 1), tokenizer_(handler_) {}
+    : handler_(receiver, parent.parentDepth + 1, !parent.announced), tokenizer_(handler_) {}
 
 // Members go in reverse order: the tokenizer's states, then the handler (which finishes an
 // open script and ends a nested pipeline), then the JSON validator.

@@ -119,6 +119,23 @@ void HtmlHandler::refreshByte(std::uint8_t byte) {
   }
 }
 
+// A refresh value in runs: once the parser has reached the target (or given up) the rest of
+// the run goes on as a whole.
+void HtmlHandler::refreshRun(const char* data, std::size_t length) {
+  while (length > 0) {
+    if (refresh_.inTarget()) {
+      if (metaUrl_ != nullptr) metaUrl_->feed(data, length);
+      return;
+    }
+    if (refresh_.gaveUp()) {
+      refresh_.addFallback(data, length);
+      return;
+    }
+    refreshByte(static_cast<std::uint8_t>(*data++));
+    --length;
+  }
+}
+
 // --- attribute callbacks --------------------------------------------------------------------
 
 int HtmlHandler::skipAttributes(std::string_view) { return html::kAttrSkip; }
