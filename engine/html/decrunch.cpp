@@ -12,15 +12,18 @@ Decrunch::Decrunch(Handler& receiver, NestedIn parent)
 // open script and ends a nested pipeline), then the JSON validator.
 Decrunch::~Decrunch() = default;
 
+// The counter and the validator, which call nobody, take the chunk before the tokenizer,
+// whose receiver may fail: a failure then cannot leave them behind the tokenizer (a page
+// whose markup the validator never saw would still pass for JSON).
 void Decrunch::feed(const char* data, std::size_t length) {
   bytes_ = addByteCount(bytes_, length);
-  tokenizer_.feed(data, length);
   // Once the validator has rejected the document it swallows every byte for ever, so the
   // rest of the page need not pass through it.
   if (!jsonRejected_) {
     json_.feed(data, length);
     jsonRejected_ = !json_.accepted();
   }
+  tokenizer_.feed(data, length);
 }
 
 }  // namespace html
