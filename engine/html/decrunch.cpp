@@ -1,9 +1,14 @@
 #include "engine/html/decrunch.h"
 
+#include "engine/common/trace.h"
+
 namespace html {
 
+// A document starts: the host may have changed its trace level since the last one.
 Decrunch::Decrunch(Handler& receiver, bool nested)
-    : handler_(receiver, nested ? 1 : 0), tokenizer_(handler_) {}
+    : handler_(receiver, nested ? 1 : 0), tokenizer_(handler_) {
+  if (!nested) ap::RefreshEngineTraceLevels();
+}
 
 Decrunch::Decrunch(Handler& receiver, NestedIn parent)
     : handler_(receiver, parent.parentDepth + 1, !parent.announced), tokenizer_(handler_) {}
