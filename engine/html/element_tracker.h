@@ -62,8 +62,9 @@ class ElementTracker {
   std::deque<Record> records_;
   std::int64_t firstNumber_ = 0;  // number of records_.front()
   std::size_t nameBytes_ = 0;
-  std::map<std::string, std::size_t, std::less<>> openCount_;
-  std::int64_t tracked_[3] = {kNone, kNone, kNone};  // a, button, select
+  std::map<std::string, std::size_t, std::less<>> openCount_;  // names open, and idle ones
+  std::size_t idleNames_ = 0;                                  // entries whose count is zero
+  std::int64_t tracked_[3] = {kNone, kNone, kNone};            // a, button, select
   bool voidJustOpened_ = false;
   std::string voidName_;
 };

@@ -121,7 +121,14 @@ class StateMachine {
     void* storage = arena_.allocate(sizeof(S));
     S* state;
     try {
-      state = ::new (storage) S(std::forward<Args>(args)...);
+      // Default-initialised, not value-initialised: states hold fixed buffers of a kilobyte
+      // or more, which must not be zeroed on every push (every field that is read has its
+      // own initialiser).
+      if constexpr (sizeof...(Args) == 0) {
+        state = ::new (storage) S;
+      } else {
+        state = ::new (storage) S(std::forward<Args>(args)...);
+      }
     } catch (...) {
       arena_.release(storage);
       throw;

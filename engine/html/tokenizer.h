@@ -326,6 +326,12 @@ class FastParserMachine
       name_.append(toLowerAscii(b));
       return util::Stay();
     }
+    static constexpr bool kBulk = true;
+    const Byte* consume(const Byte* p, const Byte* end) override {
+      const Byte* stop = kAttrNameEnd.find(p, end);
+      for (; p < stop; ++p) name_.append(toLowerAscii(*p));
+      return stop;
+    }
 
    private:
     Transition reportName(FastParserMachine& m, bool reprocess) {
@@ -355,6 +361,15 @@ class FastParserMachine
       last_ = b;
       atStart_ = false;
       return util::Stay();
+    }
+    static constexpr bool kBulk = true;
+    const Byte* consume(const Byte* p, const Byte* end) override {
+      const Byte* stop = kAttrNameEnd.find(p, end);
+      if (stop != p) {
+        last_ = stop[-1];
+        atStart_ = false;
+      }
+      return stop;
     }
 
    private:
@@ -598,6 +613,7 @@ class FastParserMachine
   // Where an unquoted value ends (collected or skipped), and a streamed one ('/' may make the
   // tag self-closing).
   static constexpr ByteSet kUnquotedEnd{">", /*whitespace=*/true};
+  static constexpr ByteSet kAttrNameEnd{">=", /*whitespace=*/true};
   static constexpr ByteSet kStreamedEnd{">/", /*whitespace=*/true};
 
   Handler* handler_;
