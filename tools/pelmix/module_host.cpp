@@ -1,5 +1,6 @@
 #include "tools/pelmix/module_host.h"
 
+#include <filesystem>
 #include <iostream>
 
 #include "framework/uvo/result.h"
@@ -31,6 +32,13 @@ uvo::result_t ModuleHost::CreateServiceFactory(
 std::string DescribeResult(uvo::result_t code) {
   return uvo::HexCode(static_cast<std::uint32_t>(code)) + " (" +
          uvo::ToUtf8(uvo::ResultMessage(code)) + ")";
+}
+
+std::string DefaultKnowledgeBase() {
+  std::error_code error;
+  const std::filesystem::path self = std::filesystem::read_symlink("/proc/self/exe", error);
+  if (error) return "example.kb";
+  return (self.parent_path() / ".." / "example.kb").lexically_normal().string();
 }
 
 }  // namespace pelmix::cli

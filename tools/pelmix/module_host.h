@@ -29,6 +29,9 @@ class ModuleHost {
   std::unique_ptr<host::Module> module_;
 };
 
+// The knowledge base the commands use without --kb: the build tree's, beside the binary.
+std::string DefaultKnowledgeBase();
+
 // "0x80000043 (Not implemented)"
 std::string DescribeResult(uvo::result_t code);
 

@@ -13,13 +13,6 @@ namespace {
 using cf::services::anti_phishing::IAntiPhishingService;
 using cf::services::anti_phishing::IAntiPhishingServiceFactory;
 
-std::string DefaultKnowledgeBase() {
-  std::error_code error;
-  const std::filesystem::path self = std::filesystem::read_symlink("/proc/self/exe", error);
-  if (error) return "example.kb";
-  return (self.parent_path() / ".." / "example.kb").lexically_normal().string();
-}
-
 // The last failure line the module traced, if any.
 std::string LastFailureLine(const host::Tracer& tracer) {
   std::string last;
