@@ -372,8 +372,9 @@ class WhiteSet:
 
 def build(args):
     psl = PublicSuffixList(args.psl)
-    orgs = read_organisations(os.path.join(HERE, 'organisations.txt'))
-    subdomains, shorteners, files, links = read_shared_content(os.path.join(HERE, 'shared_content.txt'))
+    orgs = read_organisations(os.path.join(args.curated, 'organisations.txt'))
+    subdomains, shorteners, files, links = read_shared_content(
+        os.path.join(args.curated, 'shared_content.txt'))
     src = args.sources
     groups = read_apple_groups(
         os.path.join(src, 'password-manager-resources', 'quirks', 'shared-credentials.json'))
@@ -449,7 +450,7 @@ def build(args):
 
     write_orgs(args.out, orgs)
     write_white_domains(args.out, orgs)
-    write_lexdb(args.out, orgs, read_lexicon(os.path.join(HERE, 'lexicon.txt')) +
+    write_lexdb(args.out, orgs, read_lexicon(os.path.join(args.curated, 'lexicon.txt')) +
                 read_auth0_lock(os.path.join(src, 'auth0-lock', 'package')))
     write_share_links(args.out, links)
     write_categorised_hosts(args.out, src, white, no_white)
@@ -543,12 +544,13 @@ def write_categorised_hosts(out, src, white, no_white):
     write_file(out, 'categorised_hosts.txt', lines)
 
 
-def main():
+def main(argv=None):
     parser = argparse.ArgumentParser(description=__doc__.split('\n')[0])
     parser.add_argument('--sources', required=True, help='folder filled by fetch_sources.sh')
     parser.add_argument('--out', required=True, help='the kb/ folder to write into')
     parser.add_argument('--psl', default='/usr/share/publicsuffix/public_suffix_list.dat')
-    build(parser.parse_args())
+    parser.add_argument('--curated', default=HERE, help='folder of the curated lists')
+    build(parser.parse_args(argv))
 
 
 if __name__ == '__main__':
