@@ -137,9 +137,9 @@ TEST(HashedCatHostsPathes, LargeDatabaseWholeAndInPieces) {
   std::string bytes;
   std::size_t hosts = 0;
   while (bytes.size() < 3 * hpdb::kLoadBufferSize + 17) {
-    const std::string host = "h" + std::to_string(hosts) + ".example";
+    const std::string host = std::string("h") + std::to_string(hosts) + ".example";
     bytes += HostSection(host, static_cast<std::uint16_t>(hosts % 9)) + MaskSection(hosts);
-    if (hosts % 5 == 0) bytes += PathSection("/p" + std::to_string(hosts) + "/", 100);
+    if (hosts % 5 == 0) bytes += PathSection(std::string("/p") + std::to_string(hosts) + "/", 100);
     ++hosts;
   }
   for (const std::uint64_t max_read : {0, 1, 7, 1000, 65537}) {
@@ -148,11 +148,12 @@ TEST(HashedCatHostsPathes, LargeDatabaseWholeAndInPieces) {
     const HashedCatHostsPathes db(entry);
     ASSERT_EQ(db.host_count(), hosts) << max_read;
     for (const std::size_t i : {std::size_t{0}, hosts / 2, hosts - 1}) {
-      const std::string host = "h" + std::to_string(i) + ".example";
+      const std::string host = std::string("h") + std::to_string(i) + ".example";
       const std::string tail = i % 5 == 0 ? "" : " no_paths";
       EXPECT_EQ(Ask(db, host, "/"), std::to_string(i % 9) + " " + std::to_string(i) + tail);
       if (i % 5 == 0) {
-        EXPECT_EQ(Ask(db, host, "/p" + std::to_string(i) + "/x"), "100 " + std::to_string(i));
+        EXPECT_EQ(Ask(db, host, std::string("/p") + std::to_string(i) + "/x"),
+                  std::string("100 ") + std::to_string(i));
       }
     }
   }
