@@ -38,6 +38,12 @@ JsonLine& JsonLine::Int(std::string_view key, std::int64_t value) {
   return *this;
 }
 
+JsonLine& JsonLine::Raw(std::string_view key, std::string_view json) {
+  Key(key);
+  text_ += json;
+  return *this;
+}
+
 JsonLine& JsonLine::Bool(std::string_view key, bool value) {
   Key(key);
   text_.append(value ? std::string_view("true") : std::string_view("false"));

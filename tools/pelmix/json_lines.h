@@ -19,6 +19,8 @@ class JsonLine {
   JsonLine& Bytes(std::string_view key, std::string_view value);  // escaped byte string
   JsonLine& Int(std::string_view key, std::int64_t value);
   JsonLine& Bool(std::string_view key, bool value);
+  // `json` written as it is: a number, an array, null ...
+  JsonLine& Raw(std::string_view key, std::string_view json);
   // Writes the object and a line feed.
   void Write(std::ostream& out);
 

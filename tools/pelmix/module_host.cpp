@@ -1,6 +1,7 @@
 #include "tools/pelmix/module_host.h"
 
 #include <cstdlib>
+#include <filesystem>
 #include <iostream>
 
 #include "framework/uvo/result.h"
