@@ -31,6 +31,10 @@ MASK_ETH_PHISHING_DETECT = 0x2
 POPULAR_FIRST_ID = 20001
 POPULAR_CATEGORY = 6
 MAX_NAME_BYTES = 64
+# Popular sites under these suffixes (universities) are white only for the domain itself:
+# their subdomains are run by many departments and people, and compromised ones host
+# phishing more often than any other kind of popular site.
+EXACT_POPULAR_SUFFIXES = ('edu', 'ac.uk', 'ac.jp', 'edu.au', 'ac.in')
 
 DOMAIN_RE = re.compile(r'^[a-z0-9]([a-z0-9-]*[a-z0-9])?(\.[a-z0-9]([a-z0-9-]*[a-z0-9])?)+$')
 
@@ -443,9 +447,10 @@ def build(args):
         name = name or reg
         if len(name.encode('utf-8')) > MAX_NAME_BYTES:
             name = reg
-        org = Org(next_id, POPULAR_CATEGORY, 'ZZ', name, {reg: False}, [], 'top-sites')
+        exact = psl.suffix(reg)[0] in EXACT_POPULAR_SUFFIXES
+        org = Org(next_id, POPULAR_CATEGORY, 'ZZ', name, {reg: exact}, [], 'top-sites')
         orgs[next_id] = org
-        white.add(reg, next_id, False)
+        white.add(reg, next_id, exact)
         next_id += 1
 
     write_orgs(args.out, orgs)

@@ -94,7 +94,8 @@ class WholeRun(unittest.TestCase):
         write(os.path.join(src, 'top-sites', 'package', 'top-sites.json'),
               json.dumps([{'rank': r, 'rootDomain': d} for r, d in enumerate(
                   ['news.daily-paper.org', 'mailtwo.com', 'x.github.io', 'share.example',
-                   'short.example', 'theguardian.com', 'marketplatform.google....'], 1)]))
+                   'short.example', 'theguardian.com', 'marketplatform.google....',
+                   'www.uni.edu'], 1)]))
         write(os.path.join(src, 'simple-icons', 'package', 'data', 'simple-icons.json'),
               json.dumps([{'title': 'The Guardian', 'slug': 'theguardian'}]))
         write(os.path.join(src, 'auth0-lock', 'package', 'lib', 'i18n', 'de.js'),
@@ -115,12 +116,13 @@ class WholeRun(unittest.TestCase):
     def test_lists(self):
         kb = self.run_generator()
         self.assertEqual(kb['orgs'], '1001 0\nBank One\n2001 1\nMail Two\n'
-                                     '20001 6\ndaily-paper.org\n20002 6\nThe Guardian\n')
+                                     '20001 6\ndaily-paper.org\n20002 6\nThe Guardian\n'
+                                     '20003 6\nuni.edu\n')
         white = [line for line in kb['white_domains.txt'].splitlines() if line[0] != '#']
         self.assertEqual(white, ['1001 bankone.co.uk', '1001 bankone.com',
                                  '2001 blog.example exact', '2001 mailtwo.com',
                                  '2001 old-mailtwo.com', '20001 daily-paper.org',
-                                 '20002 theguardian.com'])
+                                 '20002 theguardian.com', '20003 uni.edu exact'])
         self.assertEqual(kb['share_links.txt'], 'docs.mailtwo.com /forms\n')
         hosts = [line for line in kb['categorised_hosts.txt'].splitlines() if line[0] != '#']
         self.assertEqual(hosts, ['both.example 1 0x3', 'hosts.example 1 0x2',
