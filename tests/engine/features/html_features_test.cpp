@@ -310,6 +310,25 @@ TEST(HTMLFeatures, HostileBudgets) {
   EXPECT_EQ(r.vector.size(), kWebVectorSize);
 }
 
+TEST(HTMLFeatures, UsableAfterAFailedLookup) {
+  const std::string html =
+      "<a href=\"https://www.paypal.com/\">PayPal</a><p>verify your account</p><br>"
+      "<a href=\"https://examplebank.com/\">bank</a>";
+  Page failing("http://unknown.example/");
+  failing.world().failAt = 1;  // the first anchor's look-up
+  html::Decrunch pipeline(failing.features(), false);
+  EXPECT_THROW(pipeline.feed(html.data(), html.size()), std::runtime_error);
+  std::string target;
+  std::vector<float> v;
+  failing.features().GetVector(target, v, 0);
+  EXPECT_EQ(v.size(), kWebVectorSize);
+  // A fresh document through the same extractor still counts its links.
+  html::Decrunch again(failing.features(), false);
+  again.feed(html.data(), html.size());
+  failing.features().GetVector(target, v, again.byteCount());
+  EXPECT_NE(target.find("Example_Bank"), std::string::npos);
+}
+
 TEST(FeatureLayout, NamesAreUniqueAndComplete) {
   std::set<std::string> web, mail;
   for (std::size_t i = 0; i < kWebVectorSize; ++i)
