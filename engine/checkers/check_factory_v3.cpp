@@ -2,12 +2,16 @@
 
 #include <stdexcept>
 
+#include "engine/checkers/mail_checker_v3.h"
 #include "engine/checkers/web_checker_v3.h"
+#include "engine/common/trace.h"
 #include "engine/kb/kb_loader.h"
 
 namespace easy3_impl {
 
 std::shared_ptr<const WebCheckerV3Data> CheckFactoryV3::Load(std::shared_ptr<ap::FileIO> file) {
+  // The readers trace what they load at the host's level of now.
+  ap::RefreshEngineTraceLevels();
   auto knowledge = std::make_shared<WebCheckerV3Data>();
   loaders_misc::load(*knowledge, std::move(file));
   return knowledge;
@@ -22,7 +26,7 @@ std::shared_ptr<ap::easy2::WebCheckerI> CheckFactoryV3::CreateWebChecker(const s
 }
 
 std::shared_ptr<ap::easy2::MailCheckerI> CheckFactoryV3::CreateMailChecker(int) {
-  throw std::runtime_error("CheckFactoryV3: mail checking is not available in this build");
+  return std::make_shared<MailCheckerV3>(knowledge_);
 }
 
 bool CheckFactoryV3::IsWhiteDomain(const std::string& domain) {

@@ -16,8 +16,6 @@ namespace {
 constexpr std::int64_t kSensitiveWindow = 2;
 // Flags (third number) of a lexeme that announces a credential input.
 constexpr std::uint16_t kSensitiveFlags = 0x1 | 0x8;
-// Organisations one anchor's text can name; more add nothing.
-constexpr std::size_t kMaxAnchorKeys = LexemeSummary::kMaxKeys;
 
 float Weight(std::uint16_t w) { return static_cast<float>(w); }
 

@@ -30,11 +30,14 @@ std::string Clean(std::string_view url) {
   std::size_t b = 0, e = url.size();
   while (b < e && static_cast<unsigned char>(url[b]) <= 0x20) ++b;
   while (e > b && static_cast<unsigned char>(url[e - 1]) <= 0x20) --e;
+  url = url.substr(b, e - b);
   std::string out;
-  out.reserve(e - b);
-  for (std::size_t i = b; i < e; ++i) {
-    const char c = url[i];
-    if (c != '\t' && c != '\n' && c != '\r') out.push_back(c);
+  out.reserve(url.size());
+  while (!url.empty()) {
+    const std::size_t cut = url.find_first_of("\t\n\r");
+    out.append(url.substr(0, cut));
+    if (cut == std::string_view::npos) break;
+    url.remove_prefix(cut + 1);
   }
   return out;
 }

@@ -37,8 +37,9 @@ TEST(TracerCapture, LinesOfEachThreadStayApart) {
   for (const auto& line : b) EXPECT_EQ(line.text[0], 'b');
   EXPECT_EQ(a.back().level, 300);
   EXPECT_TRUE(tracer->Lines().empty());
-  // Only what the tracer's own level admits is echoed.
-  EXPECT_EQ(echo.str(), "a failed\nb failed\n");
+  // Only what the tracer's own level admits is echoed, in whichever order the threads ran.
+  EXPECT_TRUE(echo.str() == "a failed\nb failed\n" || echo.str() == "b failed\na failed\n")
+      << echo.str();
 
   // Without a capture the thread sees the tracer's own level again.
   cf::helpers::Trace(tracer.Get(), 700, "dropped");

@@ -6,6 +6,7 @@
 #include <cstdint>
 #include <map>
 #include <set>
+#include <stdexcept>
 #include <sstream>
 #include <string>
 #include <utility>
@@ -36,9 +37,10 @@ class World final : public ap::WhiteDomainI {
   std::set<std::string> notWhite;                // listed, but not white (a restricted listing)
   std::set<std::pair<std::string, std::string>> shareLinks, categorised;
   int lookups = 0;
+  int failAt = -1;  // the look-up with this number raises
 
   ap::WhiteDomainRecord Lookup(const char* begin, const char* end) override {
-    ++lookups;
+    if (lookups++ == failAt) throw std::runtime_error("look-up failed");
     std::string host(begin, end);
     while (true) {
       const auto it = domains.find(host);

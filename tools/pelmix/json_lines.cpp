@@ -38,15 +38,26 @@ JsonLine& JsonLine::Int(std::string_view key, std::int64_t value) {
   return *this;
 }
 
+JsonLine& JsonLine::Raw(std::string_view key, std::string_view json) {
+  Key(key);
+  text_ += json;
+  return *this;
+}
+
 JsonLine& JsonLine::Bool(std::string_view key, bool value) {
   Key(key);
   text_.append(value ? std::string_view("true") : std::string_view("false"));
   return *this;
 }
 
-JsonLine& JsonLine::Raw(std::string_view key, std::string_view json) {
+JsonLine& JsonLine::Strings(std::string_view key, const std::vector<std::string_view>& values) {
   Key(key);
-  text_.append(json);
+  text_ += '[';
+  for (std::size_t i = 0; i < values.size(); ++i) {
+    if (i > 0) text_ += ',';
+    AppendJsonBytes(text_, values[i]);
+  }
+  text_ += ']';
   return *this;
 }
 

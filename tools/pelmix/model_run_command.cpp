@@ -1,12 +1,15 @@
 // pelmix model run: builds a decision model from a flow file and runs it on feature vectors
 // read from stdin, one per line, printing the outputs and the decision for each.
-#include <charconv>
+#include <algorithm>
+#include <cctype>
 #include <cstdio>
 #include <filesystem>
 #include <fstream>
 #include <iostream>
+#include <limits>
 #include <memory>
 #include <sstream>
+#include <string_view>
 
 #include "engine/kb/float_parser.h"
 #include "engine/kb/readable_buffer.h"
@@ -81,7 +84,30 @@ std::string Single(float value) {
   return text;
 }
 
-// Blank-separated decimal floats ("nan" and "inf" included, as the models must cope).
+// "nan" and "inf" (any case, optionally signed), which the models must cope with but the
+// knowledge-base number reader has no spelling for.
+bool ParseSpecial(std::string_view token, float& value) {
+  const bool negative = !token.empty() && token[0] == '-';
+  if (!token.empty() && (token[0] == '-' || token[0] == '+')) token.remove_prefix(1);
+  const auto is = [&](std::string_view word) {
+    return token.size() == word.size() &&
+           std::equal(token.begin(), token.end(), word.begin(), [](char a, char b) {
+             return std::tolower(static_cast<unsigned char>(a)) == b;
+           });
+  };
+  if (is("nan")) {
+    value = std::numeric_limits<float>::quiet_NaN();
+  } else if (is("inf") || is("infinity")) {
+    value = std::numeric_limits<float>::infinity();
+  } else {
+    return false;
+  }
+  if (negative) value = -value;
+  return true;
+}
+
+// Blank-separated numbers, read as the engine reads the numbers of its knowledge bases
+// (ap::FloatParser), so that a vector reads here as it would there.
 bool ParseFeatures(const std::string& line, std::vector<float>& features, std::string& error) {
   features.clear();
   std::size_t at = 0;
@@ -92,11 +118,15 @@ bool ParseFeatures(const std::string& line, std::vector<float>& features, std::s
     }
     std::size_t end = at;
     while (end < line.size() && line[end] != ' ' && line[end] != '\t' && line[end] != '\r') ++end;
+    const std::string_view token(line.data() + at, end - at);
     float value = 0;
-    const auto [stop, code] = std::from_chars(line.data() + at, line.data() + end, value);
-    if (code != std::errc() || stop != line.data() + end) {
-      error = "not a number: " + line.substr(at, end - at);
-      return false;
+    if (!ParseSpecial(token, value)) {
+      try {
+        value = static_cast<float>(ap::FloatParser::Parse(token));
+      } catch (const std::exception&) {
+        error = "not a number: " + std::string(token);
+        return false;
+      }
     }
     features.push_back(value);
     at = end;

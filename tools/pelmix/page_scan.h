@@ -13,6 +13,7 @@
 
 #include "framework/uvo/anti_phishing.h"
 #include "host/tracer.h"
+#include "tools/pelmix/judging.h"
 
 namespace pelmix::cli {
 
@@ -26,18 +27,6 @@ struct PageScanOptions {
   std::int32_t level = 2;
   std::size_t chunk = 4096;
   bool features = false;
-};
-
-struct PageResult {
-  std::string error;  // empty when the page was judged
-  bool phishing = false;
-  bool quiet = true;
-  double weight = 0;
-  std::string target;
-  int confidence = 0;
-  std::int64_t dbstamp = 0;
-  // The vector the model judged, as the module wrote it (%.9g each); none for a trusted page.
-  std::optional<std::vector<std::string>> features;
 };
 
 // One page judged as its bytes arrive, for hosts that do not hold the page whole (a file read
@@ -55,7 +44,7 @@ class PageJudgement {
   bool Append(std::string_view chunk);
   bool Failed() const { return !error_.empty(); }
   // The verdict, or the first failure. Call once, after the last chunk.
-  PageResult Finish();
+  Judgement Finish();
 
  private:
   host::Tracer::ThreadCapture capture_;
@@ -64,7 +53,7 @@ class PageJudgement {
   std::string error_;  // the first failure, if any
 };
 
-PageResult ScanPage(cf::services::anti_phishing::IHttpSessionFactory& sessions,
-                    const PageInput& input, const PageScanOptions& options);
+Judgement ScanPage(cf::services::anti_phishing::IHttpSessionFactory& sessions,
+                   const PageInput& input, const PageScanOptions& options);
 
 }  // namespace pelmix::cli

@@ -7,6 +7,9 @@
 #include <optional>
 
 #include "host/tracer.h"
+#include "tools/mail/mail_limits.h"
+#include "tools/mail/message_buffer.h"
+#include "tools/pelmix/mail_scan.h"
 #include "tools/pelmix/page_scan.h"
 #include "tools/pelmixd/bounded_pool.h"
 
@@ -146,6 +149,9 @@ Server::Server(const Options& options, ServiceHolder& services, Metrics& metrics
   http_.Post("/v1/web",
              [this](const httplib::Request& request, httplib::Response& response,
                     const httplib::ContentReader& reader) { Web(request, response, reader); });
+  http_.Post("/v1/mail",
+             [this](const httplib::Request& request, httplib::Response& response,
+                    const httplib::ContentReader& reader) { Mail(request, response, reader); });
   http_.Get("/v1/white", [this](const httplib::Request& request, httplib::Response& response) {
     White(request, response);
   });
@@ -179,27 +185,20 @@ bool Server::Run() { return http_.listen_after_bind(); }
 
 void Server::Stop() { http_.stop(); }
 
-void Server::Web(const httplib::Request& request, httplib::Response& response,
-                 const httplib::ContentReader& reader) {
-  // Refused before its body is read: the connection cannot carry another request.
-  const auto refuse = [&](int status, const std::string& error) {
-    response.set_header("Connection", "close");
-    Fail(response, status, error);
-  };
-  // Multipart bodies would need the form parser; the page is the body itself.
-  if (request.is_multipart_form_data()) {
-    return refuse(415, "send the page itself as the body, not a form");
-  }
-  if (!request.has_param("url") || request.get_param_value("url").empty()) {
-    return refuse(400, "missing url: POST /v1/web?url=URL with the page as the body");
-  }
-  int level = 0;
-  if (!LevelOf(request, options_.level, level)) return refuse(400, "level needs 1, 2 or 3");
-  const std::shared_ptr<const LoadedService> service = services_.Current();
+namespace {
 
-  cli::PageScanOptions scan;
-  scan.level = level;
-  cli::PageJudgement judgement(*service->web.Get(), request.get_param_value("url"), scan);
+// Refused before its body was read: the connection cannot carry another request.
+void Refuse(httplib::Response& response, int status, const std::string& error) {
+  response.set_header("Connection", "close");
+  Fail(response, status, error);
+}
+
+}  // namespace
+
+// Reads the body in the chunks it arrives in, up to --max-body. Returns false after answering
+// the request with the error.
+bool Server::ReadBody(const httplib::ContentReader& reader, httplib::Response& response,
+                      const std::function<void(std::string_view)>& sink) {
   std::size_t received = 0;
   bool tooLarge = false;
   const bool read = reader([&](const char* data, std::size_t length) {
@@ -208,19 +207,26 @@ void Server::Web(const httplib::Request& request, httplib::Response& response,
       tooLarge = true;
       return false;
     }
-    judgement.Append({data, length});
+    sink({data, length});
     return true;
   });
   if (tooLarge || response.status == 413) {
-    return refuse(
-        413, "the body is larger than the limit of " + std::to_string(options_.maxBody) + " bytes");
+    Refuse(response, 413,
+           "the body is larger than the limit of " + std::to_string(options_.maxBody) + " bytes");
+    return false;
   }
-  if (!read) return refuse(400, "the body could not be read");
-  const cli::PageResult result = judgement.Finish();
+  if (!read) {
+    Refuse(response, 400, "the body could not be read");
+    return false;
+  }
+  return true;
+}
+
+void Server::Judged(Endpoint endpoint, const cli::Judgement& result, httplib::Response& response) {
   if (!result.error.empty()) {
-    return Fail(response, 422, "the page could not be judged: " + result.error);
+    return Fail(response, 422, "the input could not be judged: " + result.error);
   }
-  metrics_.CountVerdict(Endpoint::kWeb, result.phishing);
+  metrics_.CountVerdict(endpoint, result.phishing);
   Answer(response, 200,
          json{{"phishing", result.phishing},
               {"quiet", result.quiet},
@@ -228,6 +234,57 @@ void Server::Web(const httplib::Request& request, httplib::Response& response,
               {"target", result.target},
               {"confidence", result.confidence},
               {"dbstamp", result.dbstamp}});
+}
+
+void Server::Web(const httplib::Request& request, httplib::Response& response,
+                 const httplib::ContentReader& reader) {
+  // Multipart bodies would need the form parser; the page is the body itself.
+  if (request.is_multipart_form_data()) {
+    return Refuse(response, 415, "send the page itself as the body, not a form");
+  }
+  if (!request.has_param("url") || request.get_param_value("url").empty()) {
+    return Refuse(response, 400, "missing url: POST /v1/web?url=URL with the page as the body");
+  }
+  int level = 0;
+  if (!LevelOf(request, options_.level, level)) {
+    return Refuse(response, 400, "level needs 1, 2 or 3");
+  }
+  const std::shared_ptr<const LoadedService> service = services_.Current();
+  cli::PageScanOptions scan;
+  scan.level = level;
+  cli::PageJudgement judgement(*service->web.Get(), request.get_param_value("url"), scan);
+  if (!ReadBody(reader, response, [&](std::string_view chunk) { judgement.Append(chunk); })) {
+    return;
+  }
+  Judged(Endpoint::kWeb, judgement.Finish(), response);
+}
+
+void Server::Mail(const httplib::Request& request, httplib::Response& response,
+                  const httplib::ContentReader& reader) {
+  if (request.is_multipart_form_data()) {
+    return Refuse(response, 415, "send the message itself as the body, not a form");
+  }
+  int level = 0;
+  if (!LevelOf(request, options_.level, level)) {
+    return Refuse(response, 400, "level needs 1, 2 or 3");
+  }
+  const std::shared_ptr<const LoadedService> service = services_.Current();
+  // The MIME parser needs the message whole. Past the message budget the bytes are skipped,
+  // as the mail readers of the CLI skip them.
+  mail::MessageBuffer message;
+  message.index = 1;
+  if (!ReadBody(reader, response, [&](std::string_view chunk) {
+        message.inputBytes += chunk.size();
+        const std::size_t room = mail::kMaxMessageBytes - message.size();
+        if (chunk.size() > room) message.cut = true;
+        message.Append(chunk.substr(0, std::min(room, chunk.size())));
+      })) {
+    return;
+  }
+  if (message.size() == 0) return Fail(response, 400, "the body is empty: send the message");
+  cli::MailScanOptions scan;
+  scan.level = level;
+  Judged(Endpoint::kMail, cli::ScanMessage(*service->mail.Get(), message, scan), response);
 }
 
 void Server::White(const httplib::Request& request, httplib::Response& response) {

@@ -4,9 +4,12 @@
 
 #include <httplib.h>
 
+#include <functional>
 #include <memory>
 #include <string>
+#include <string_view>
 
+#include "tools/pelmix/judging.h"
 #include "tools/pelmixd/metrics.h"
 #include "tools/pelmixd/options.h"
 #include "tools/pelmixd/service_holder.h"
@@ -33,6 +36,11 @@ class Server {
  private:
   void Web(const httplib::Request& request, httplib::Response& response,
            const httplib::ContentReader& reader);
+  void Mail(const httplib::Request& request, httplib::Response& response,
+            const httplib::ContentReader& reader);
+  bool ReadBody(const httplib::ContentReader& reader, httplib::Response& response,
+                const std::function<void(std::string_view)>& sink);
+  void Judged(Endpoint endpoint, const cli::Judgement& result, httplib::Response& response);
   void White(const httplib::Request& request, httplib::Response& response);
   void Health(const httplib::Request& request, httplib::Response& response);
 

@@ -50,6 +50,8 @@ std::string ServiceHolder::Load() {
   if (code < 0) return failed(kbPath_ + ": the service failed to load", code);
   code = loaded->service->GetHttpSessionFactory(loaded->web.Receive());
   if (code < 0) return failed("no web session factory", code);
+  code = loaded->service->GetMailSessionFactory(loaded->mail.Receive());
+  if (code < 0) return failed("no mail session factory", code);
 
   // A page judged end to end proves the service works and tells its knowledge-base stamp.
   uvo::Ptr<IHttpSession> probe;

@@ -18,6 +18,7 @@ namespace pelmix::pelmixd {
 struct LoadedService {
   uvo::Ptr<cf::services::anti_phishing::IAntiPhishingService> service;
   uvo::Ptr<cf::services::anti_phishing::IHttpSessionFactory> web;
+  uvo::Ptr<cf::services::anti_phishing::IMailSessionFactory> mail;
   std::string kbPath;
   std::int64_t dbstamp = 0;
   std::chrono::system_clock::time_point loadedAt;

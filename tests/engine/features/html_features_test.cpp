@@ -211,6 +211,14 @@ TEST(HTMLFeatures, TrustedPages) {
   World& w = shared.world();
   HTMLFeatures form("https://forms.popular.com/f/abc?x=1", w, none);
   EXPECT_FALSE(form.trusted());  // content anyone can publish is never trusted
+  // A host listed with "/" publishes under every path; its siblings stay trusted.
+  w.shareLinks.insert({"gist.popular.com", "/"});
+  for (const char* url : {"https://gist.popular.com/", "https://gist.popular.com/user/1a2b",
+                          "https://gist.popular.com/user/?q=1"}) {
+    EXPECT_FALSE(HTMLFeatures(url, w, none).trusted()) << url;
+  }
+  EXPECT_TRUE(HTMLFeatures("https://www.popular.com/user/1a2b", w, none).trusted());
+  EXPECT_TRUE(HTMLFeatures("https://forms.popular.com/g/abc", w, none).trusted());
   w.categorised.insert({"phish.example", "/login"});
   HTMLFeatures phish("http://phish.example/login", w, none);
   EXPECT_TRUE(phish.pageCategorised());
@@ -300,6 +308,25 @@ TEST(HTMLFeatures, HostileBudgets) {
   const Result r = page.Run(html);
   EXPECT_EQ(Total(r, kEvAnchorUnknownHost), 20000.0f);
   EXPECT_EQ(r.vector.size(), kWebVectorSize);
+}
+
+TEST(HTMLFeatures, UsableAfterAFailedLookup) {
+  const std::string html =
+      "<a href=\"https://www.paypal.com/\">PayPal</a><p>verify your account</p><br>"
+      "<a href=\"https://examplebank.com/\">bank</a>";
+  Page failing("http://unknown.example/");
+  failing.world().failAt = 1;  // the first anchor's look-up
+  html::Decrunch pipeline(failing.features(), false);
+  EXPECT_THROW(pipeline.feed(html.data(), html.size()), std::runtime_error);
+  std::string target;
+  std::vector<float> v;
+  failing.features().GetVector(target, v, 0);
+  EXPECT_EQ(v.size(), kWebVectorSize);
+  // A fresh document through the same extractor still counts its links.
+  html::Decrunch again(failing.features(), false);
+  again.feed(html.data(), html.size());
+  failing.features().GetVector(target, v, again.byteCount());
+  EXPECT_NE(target.find("Example_Bank"), std::string::npos);
 }
 
 TEST(FeatureLayout, NamesAreUniqueAndComplete) {

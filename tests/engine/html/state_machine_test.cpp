@@ -22,7 +22,7 @@ class LogMachine : public util::StateMachine<char, LogMachine> {
 
    private:
     int* destroyed_;
-    char pad_[32] = {};
+    [[maybe_unused]] char pad_[32] = {};  // gives the states a size the arena must honour
   };
 
   // 'p' pushes Echo and offers it the same byte; '!' tries to pop the bottom.

@@ -55,7 +55,7 @@ TEST(CfgString, Messages) {
       {R"(key="escaped\")", "Invalid quoted value in cfg"},
   };
   for (const auto& [line, message] : cases) {
-    EXPECT_EQ(ErrorOf([&] { ParseCfgString(line); }), message) << line;
+    EXPECT_EQ(ErrorOf([line = line] { ParseCfgString(line); }), message) << line;
   }
 }
 

@@ -35,7 +35,7 @@ TEST(FloatParser, Messages) {
       {"1e5.", "wrong exponenta symbol"},     {"1ex", "wrong first exponenta symbol"},
       {"1e ", "wrong first exponenta symbol"}};
   for (const auto& [text, message] : cases) {
-    EXPECT_EQ(pelmix::testing::ErrorOf([&] { FloatParser::Parse(text); }),
+    EXPECT_EQ(pelmix::testing::ErrorOf([text = text] { FloatParser::Parse(text); }),
               std::string("FloatParser: ") + message)
         << text;
   }

@@ -5,6 +5,7 @@
 #include <map>
 #include <sstream>
 #include <string>
+#include <utility>
 
 #include "engine/kb/simple_solver.h"
 #include "engine/ml/deep_solver.h"
@@ -108,6 +109,37 @@ TEST_F(ModelRun, LineErrorsAreReportedInPlace) {
   const CliRun longLine = Run(Dir() + " boost.flow", std::string(1 << 21, ' ') + "\n0.5 0.5\n");
   EXPECT_EQ(longLine.out,
             "error\tfeature line longer than 1048576 bytes\n0.25 0.25\t0\t0\t0.25\t.25 .25\n");
+}
+
+// Feature values read as the knowledge bases' numbers do: every spelling on the left gives
+// the same answer as the plain one on the right; the words the models must cope with too.
+TEST_F(ModelRun, NumbersReadAsTheEngineReadsThem) {
+  const std::pair<const char*, const char*> same[] = {
+      {"+0.25 +0.81", "0.25 0.81"},
+      {"+.25 0.81e0", "0.25 0.81"},
+      {"25e-2 81E-2", "0.25 0.81"},
+      {"-0.5 +1", "-0.5 1"},
+      {"NaN +Inf", "nan inf"},
+      {"-INFINITY 0", "-inf 0"},
+      {"- .", "0 0"},
+      {"5e 2.", "5 2"},
+      {"0.25\t\t0.81\r", "0.25 0.81"},
+  };
+  std::string spelled, plain;
+  for (const auto& [a, b] : same) {
+    spelled += std::string(a) + "\n";
+    plain += std::string(b) + "\n";
+  }
+  const CliRun run = Run(Dir() + " boost.flow", spelled);
+  EXPECT_EQ(run.status, 0) << run.out;
+  EXPECT_EQ(run.out, Run(Dir() + " boost.flow", plain).out);
+  EXPECT_EQ(run.out.find("error"), std::string::npos) << run.out;
+
+  for (const char* bad : {"++1", "0x10", "1,5", "1e5.", "--1", "nanx", "1 2 three"}) {
+    const CliRun refused = Run(Dir() + " boost.flow", std::string(bad) + "\n");
+    EXPECT_EQ(refused.status, 1) << bad;
+    EXPECT_EQ(refused.out.rfind("error\tnot a number: ", 0), 0u) << bad << ": " << refused.out;
+  }
 }
 
 TEST_F(ModelRun, ConstructionErrorsStopTheRun) {

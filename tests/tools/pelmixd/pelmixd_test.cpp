@@ -182,6 +182,55 @@ TEST_F(Pelmixd, AgreesWithPelmixScan) {
   }
 }
 
+// Messages are parsed with the same MIME walk as pelmix mail and get the same judgement.
+TEST_F(Pelmixd, MailAgreesWithPelmixMail) {
+  Start();
+  httplib::Client client = daemon_.Client();
+  int phishing = 0;
+  for (const auto& entry : std::filesystem::directory_iterator(PELMIX_MAIL_DATA_DIR)) {
+    const std::string file = entry.path().string();
+    if (entry.path().extension() != ".eml") continue;
+    const std::string message = service_test::ReadFileBytes(file);
+    for (int level = 1; level <= 3; level += 2) {
+      const auto run =
+          RunCli("mail --json --kb " + Kb() + " --level " + std::to_string(level) + " " + file);
+      const json cli = json::parse(run.out, nullptr, false);
+      ASSERT_FALSE(cli.is_discarded()) << file << run.out << run.err;
+      auto answer = client.Post(("/v1/mail?level=" + std::to_string(level)).c_str(), message,
+                                "message/rfc822");
+      ASSERT_TRUE(answer);
+      if (cli.contains("error")) {
+        EXPECT_EQ(answer->status, 422) << file;
+        continue;
+      }
+      ASSERT_EQ(answer->status, 200) << file << answer->body;
+      const json served = json::parse(answer->body);
+      for (const char* key : {"phishing", "quiet", "target", "confidence", "dbstamp"}) {
+        EXPECT_EQ(served[key], cli[key]) << file << " " << level << " " << key;
+      }
+      char weight[32];
+      std::snprintf(weight, sizeof weight, "%.9g", served["weight"].get<double>());
+      EXPECT_EQ(weight, cli["weight"].dump()) << file;
+      phishing += served["phishing"] == true;
+    }
+  }
+  EXPECT_GT(phishing, 0) << "no phishing message among the samples: the comparison is weak";
+  // What is not a message, or nothing at all.
+  auto answer = client.Post(
+      "/v1/mail", service_test::ReadFileBytes(std::string(PELMIX_MAIL_DATA_DIR) + "/garbage.bin"),
+      "message/rfc822");
+  ASSERT_TRUE(answer);
+  EXPECT_EQ(answer->status, 422) << answer->body;
+  answer = client.Post("/v1/mail", "", "message/rfc822");
+  ASSERT_TRUE(answer);
+  EXPECT_EQ(answer->status, 400) << answer->body;
+  auto metrics = client.Get("/metrics");
+  ASSERT_TRUE(metrics);
+  EXPECT_NE(metrics->body.find("pelmixd_verdicts_total{endpoint=\"mail\",verdict=\"phishing\"} " +
+                               std::to_string(phishing) + "\n"),
+            std::string::npos);
+}
+
 // The body goes into the session as it arrives: any chunking gives the verdict of the whole.
 TEST_F(Pelmixd, ChunkedBodiesGiveTheVerdictOfTheWholePage) {
   Start();
@@ -225,6 +274,8 @@ TEST_F(Pelmixd, RefusesBadRequestsWithJsonErrors) {
       {"POST", "/v1/web?url=http%3A%2F%2Fa%2F", "multipart/form-data; boundary=x", 415},
       {"GET", "/v1/web?url=http%3A%2F%2Fa%2F", "", 404},
       {"GET", "/v1/white", "", 400},
+      {"POST", "/v1/mail?level=0", "message/rfc822", 400},
+      {"POST", "/v1/mail", "multipart/form-data; boundary=x", 415},
       {"GET", "/nothing/here", "", 404},
       {"POST", "/healthz", "text/plain", 404},
   };

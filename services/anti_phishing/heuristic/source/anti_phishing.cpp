@@ -1,7 +1,6 @@
 #include "services/anti_phishing/heuristic/source/anti_phishing.h"
 
 #include <atomic>
-#include <boost/format.hpp>
 #include <new>
 #include <stdexcept>
 
@@ -11,6 +10,7 @@
 #include "internal/helpers/io_adapters/antiphishing_io_adapter.h"
 #include "internal/helpers/tracer/trace_writer.h"
 #include "services/anti_phishing/heuristic/source/http_session.h"
+#include "services/anti_phishing/heuristic/source/mail_session.h"
 
 namespace cf::services::anti_phishing::heuristic {
 namespace {
@@ -36,8 +36,11 @@ platform::CriticalSection& ConstructionLock() {
 
 std::atomic<std::uint32_t> sessionCounter{0};
 
+// "%s %u\t", composed by hand: Boost.Format parses through the locale's ctype facet, whose
+// lazily filled narrow cache libstdc++ writes without a lock, and sessions are created on
+// many threads at once.
 std::string SessionPrefix(const char* kind) {
-  return (boost::format("%s %u\t") % kind % NextSessionNumber()).str();
+  return std::string(kind) + ' ' + std::to_string(NextSessionNumber()) + '\t';
 }
 
 }  // namespace
@@ -55,9 +58,8 @@ int GetConfidence(std::int32_t protectionLevel) {
     case 3:
       return 0;
     default:
-      throw std::runtime_error(
-          (boost::format("GetConfidence: unexpected protection level value - %d") % protectionLevel)
-              .str());
+      throw std::runtime_error("GetConfidence: unexpected protection level value - " +
+                               std::to_string(protectionLevel));
   }
 }
 
@@ -191,8 +193,11 @@ uvo::result_t AntiPhishing::CreateSession(const SessionSettings* settings, IMail
     std::shared_ptr<ap::easy2::MailCheckerI> checker = checkFactory_->CreateMailChecker(confidence);
     if (!checker) throw std::runtime_error("Can't create mail checker");
     const std::string prefix = SessionPrefix("mail session");
-    // Mail sessions are not part of this build yet.
-    throw std::runtime_error("Can't create new session");
+    auto session = uvo::Ptr<MailSession>::Adopt(MailSession::Create(
+        services_.locator.Get(), prefix, std::move(checker), *settings, tracerHolder_));
+    if (!session) throw std::runtime_error("Can't create new session");
+    *out = session.Detach();
+    return uvo::kOk;
   } catch (...) {
     return dispatcher_.Dispatch(kCreateSession);
   }

@@ -1,6 +1,6 @@
 #include "services/anti_phishing/heuristic/source/verdict_records.h"
 
-#include <boost/format.hpp>
+#include <charconv>
 
 #include "services/anti_phishing/heuristic/source/anti_phishing.h"
 
@@ -20,10 +20,16 @@ void FillHeuristicVerdictInfo(const ap::easy2::EngineVerdict& engine, std::int32
   out.weight = static_cast<double>(engine.weight);
 }
 
+// The text forms are composed by hand rather than through Boost.Format, whose parsing fills
+// the locale's narrow cache without a lock: sessions trace on many threads at once. The
+// weight is "%.6f" in the C locale whatever locale the host runs in.
 std::string TextOf(const Verdict& verdict) {
-  return (boost::format("Verdict { phishingDetected = %d, confirmedVerdict = %d }") %
-          static_cast<int>(verdict.phishingDetected) % static_cast<int>(verdict.confirmedVerdict))
-      .str();
+  std::string text = "Verdict { phishingDetected = ";
+  text += verdict.phishingDetected ? '1' : '0';
+  text += ", confirmedVerdict = ";
+  text += verdict.confirmedVerdict ? '1' : '0';
+  text += " }";
+  return text;
 }
 
 std::string TextOf(const HeuristicVerdictInfo& info) {
@@ -31,7 +37,10 @@ std::string TextOf(const HeuristicVerdictInfo& info) {
   std::string text = "Heuristic {, confidence = ";
   text += std::to_string(static_cast<unsigned>(info.confidence));
   text += ", weight = ";
-  text += (boost::format("%.6f") % info.weight).str();
+  char weight[400];  // "%.6f" of the largest double needs 316 characters
+  const auto [end, error] =
+      std::to_chars(weight, weight + sizeof weight, info.weight, std::chars_format::fixed, 6);
+  text.append(weight, error == std::errc() ? end : weight);
   text += ", target = ";
   text += info.target.view();
   text += ", dbstamp = ";

@@ -3,6 +3,8 @@
 
 #include <gtest/gtest.h>
 
+#include <cmath>
+#include <cstdio>
 #include <new>
 
 #include "host/allocator.h"
@@ -55,6 +57,18 @@ TEST(VerdictRecords, HeuristicTextForms) {
     EXPECT_EQ(info.quiet, row.engine.quiet);
     EXPECT_EQ(info.target.view(), row.engine.target);
     EXPECT_EQ(info.weight, static_cast<double>(row.engine.weight));
+  }
+}
+
+TEST(VerdictRecords, WeightIsWrittenAsPrintfWouldInTheCLocale) {
+  auto allocator = pelmix::host::Allocator::Create();
+  for (const float weight : {0.1f, 0.5f, 0.0000005f, 1e30f, -0.0f, 3.4e38f, NAN, INFINITY}) {
+    HeuristicVerdictInfo info{};
+    FillHeuristicVerdictInfo(Engine(false, false, weight, "", 0), 2, allocator.Get(), info);
+    char expected[400];
+    std::snprintf(expected, sizeof expected, "%.6f", static_cast<double>(weight));
+    EXPECT_EQ(TextOf(info), "Heuristic {, confidence = 1, weight = " + std::string(expected) +
+                                ", target = , dbstamp = 0 }");
   }
 }
 
