@@ -89,10 +89,26 @@ double Percentile(std::vector<double>& values, double p) {
   return values[at];
 }
 
-// Each iteration: every client thread sends kPerClient pages over one keep-alive connection.
-void BM_PelmixdWeb(benchmark::State& state) {
+// A message with a plain and an HTML part, the HTML being the first `size` bytes of the page.
+const std::string& Message(std::size_t size) {
+  static std::string messages[2];
+  std::string& message = messages[size <= 4 * 1024 ? 0 : 1];
+  if (message.empty()) {
+    message =
+        "From: Example Bank <service@examplebank.example.net>\r\nTo: you@example.org\r\n"
+        "Subject: Your account has been suspended\r\nMIME-Version: 1.0\r\n"
+        "Content-Type: multipart/alternative; boundary=\"b1\"\r\n\r\n--b1\r\n"
+        "Content-Type: text/plain; charset=utf-8\r\n\r\nPlease verify your account at "
+        "http://login-examplebank.example.net/verify\r\n--b1\r\n"
+        "Content-Type: text/html; charset=utf-8\r\n\r\n" +
+        Page(size) + "\r\n--b1--\r\n";
+  }
+  return message;
+}
+
+// Each iteration: every client thread sends kPerClient bodies over one keep-alive connection.
+void Run(benchmark::State& state, const char* target, const std::string& page) {
   constexpr int kPerClient = 50;
-  const std::string& page = Page(static_cast<std::size_t>(state.range(0)));
   const int clients = static_cast<int>(state.range(1));
   const int port = Shared().Port();
   if (port == 0) {
@@ -112,8 +128,7 @@ void BM_PelmixdWeb(benchmark::State& state) {
         client.set_tcp_nodelay(true);
         for (int i = 0; i < kPerClient; ++i) {
           const auto start = std::chrono::steady_clock::now();
-          auto answer =
-              client.Post("/v1/web?url=https%3A%2F%2Flogin.example.net%2F", page, "text/html");
+          auto answer = client.Post(target, page, "text/html");
           times[static_cast<std::size_t>(c)].push_back(
               std::chrono::duration<double, std::milli>(std::chrono::steady_clock::now() - start)
                   .count());
@@ -138,6 +153,18 @@ void BM_PelmixdWeb(benchmark::State& state) {
       latencies.empty() ? 0 : *std::max_element(latencies.begin(), latencies.end());
   state.counters["failed"] = static_cast<double>(failures);
 }
+void BM_PelmixdWeb(benchmark::State& state) {
+  Run(state, "/v1/web?url=https%3A%2F%2Flogin.example.net%2F",
+      Page(static_cast<std::size_t>(state.range(0))));
+}
+void BM_PelmixdMail(benchmark::State& state) {
+  Run(state, "/v1/mail", Message(static_cast<std::size_t>(state.range(0))));
+}
+BENCHMARK(BM_PelmixdMail)
+    ->ArgsProduct({{4 * 1024, 64 * 1024}, {1, 8}})
+    ->ArgNames({"bytes", "clients"})
+    ->UseRealTime()
+    ->Unit(benchmark::kMillisecond);
 BENCHMARK(BM_PelmixdWeb)
     ->ArgsProduct({{4 * 1024, 64 * 1024}, {1, 8}})
     ->ArgNames({"bytes", "clients"})
