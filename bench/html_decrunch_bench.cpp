@@ -8,44 +8,13 @@
 #include <vector>
 
 #include "bench/html_pages.h"
+#include "bench/scan_handlers.h"
 #include "engine/html/decrunch.h"
 
 namespace {
 
-// Takes what the page analysis takes: page text, title, description, anchors and scripts
-// (no comment or select sinks), and only counts.
-class CountingReceiver final : public html::Decrunch::Handler {
- public:
-  class Sink final : public html::Decrunch::TextHandler {
-   public:
-    void text(const char*, std::size_t n) override { bytes += n; }
-    void breakText() override {}
-    void end() override {}
-    std::size_t bytes = 0;
-  };
-
-  void text(const char*, std::size_t n) override { textBytes += n; }
-  void breakText() override {}
-  void end() override {}
-  void url(std::string_view, html::UrlKind) override { ++urls; }
-  void scriptUrl(std::string_view) override { ++urls; }
-  TextHandler* commentSink() override { return nullptr; }
-  TextHandler* titleSink() override { return &sink; }
-  TextHandler* descriptionSink() override { return &sink; }
-  TextHandler* selectSink() override { return nullptr; }
-  TextHandler* anchorSink(const html_decrunch::HtmlHandler&) override { return &sink; }
-  TextHandler* scriptSink(const html_decrunch::HtmlHandler&) override { return &sink; }
-  void input(const html_decrunch::HtmlHandler&) override { ++inputs; }
-  void beginNested() override {}
-  void endNested() override {}
-
-  Sink sink;
-  std::size_t textBytes = 0;
-  std::size_t urls = 0;
-  std::size_t inputs = 0;
-};
-
-constexpr std::size_t kChunk = 4096;  // the size the web session hands over
+using bench_scan::CountingReceiver;
+using bench_scan::kChunk;
 
 void DecrunchDocuments(benchmark::State& state, const std::vector<std::string>& documents) {
   std::size_t bytes = 0;
@@ -72,6 +41,54 @@ void BM_DecrunchSyntheticPage(benchmark::State& state) {
   DecrunchDocuments(state, page);
 }
 BENCHMARK(BM_DecrunchSyntheticPage);
+
+// A page of ordinary meta refreshes (whose targets are no data URL) against plain text of the
+// same size: the refreshes should cost what their bytes cost.
+std::string RefreshFlood() {
+  std::string page;
+  while (page.size() < 2'300'000) {
+    page += "<meta http-equiv=\"refresh\" content=\"0; url=https://example.test/" +
+            std::string(1100, 'p') + "\">\n";
+  }
+  return page;
+}
+
+void BM_DecrunchRefreshFlood(benchmark::State& state) {
+  static const std::vector<std::string> page = {RefreshFlood()};
+  DecrunchDocuments(state, page);
+}
+BENCHMARK(BM_DecrunchRefreshFlood);
+
+void BM_DecrunchShortRefreshFlood(benchmark::State& state) {
+  static const std::vector<std::string> page = [] {
+    std::string flood;
+    for (int i = 0; i < 50000; ++i) flood += "<meta http-equiv=refresh content='5;url=/a'>";
+    return std::vector<std::string>{flood};
+  }();
+  DecrunchDocuments(state, page);
+}
+BENCHMARK(BM_DecrunchShortRefreshFlood);
+
+// The short refreshes' bytes as tags nobody reads: what dense markup of that shape costs.
+void BM_DecrunchShortTags(benchmark::State& state) {
+  static const std::vector<std::string> page = [] {
+    std::string tags;
+    for (int i = 0; i < 50000; ++i) tags += "<span http-equiv=refresh content='5;url=/a'>";
+    return std::vector<std::string>{tags};
+  }();
+  DecrunchDocuments(state, page);
+}
+BENCHMARK(BM_DecrunchShortTags);
+
+void BM_DecrunchPlainText(benchmark::State& state) {
+  static const std::vector<std::string> page = [] {
+    std::string text;
+    while (text.size() < 2'300'000) text += "Plain words of a page, line after line.\n";
+    return std::vector<std::string>{text + "<br>"};
+  }();
+  DecrunchDocuments(state, page);
+}
+BENCHMARK(BM_DecrunchPlainText);
 
 bool RegisterCorpus() {
   const std::vector<std::string> documents = bench_pages::CorpusDocuments();

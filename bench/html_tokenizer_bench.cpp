@@ -7,48 +7,13 @@
 #include <vector>
 
 #include "bench/html_pages.h"
+#include "bench/scan_handlers.h"
 #include "engine/html/tokenizer.h"
 
 namespace {
 
-// Wants what a page analyser wants: a few URL attributes collected, image text streamed,
-// script text delivered, everything else skipped.
-class AnalyserLikeHandler {
- public:
-  struct Sink {
-    void text(const char*, std::size_t n) { bytes += n; }
-    void end() {}
-    std::size_t bytes = 0;
-  };
-
-  void text(const char*, std::size_t n) { textBytes += n; }
-  bool openElement(std::string_view name) {
-    ++elements;
-    return name == "a" || name == "img" || name == "input" || name == "form" || name == "link" ||
-           name == "meta" || name == "script" || name == "iframe";
-  }
-  bool startTagEnd() { return true; }
-  void closeElement(std::string_view) {}
-  int attributeName(std::string_view name) {
-    if (name == "href" || name == "src" || name == "action" || name == "content") {
-      return html::kAttrCollect;
-    }
-    if (name == "alt" || name == "placeholder") return html::kAttrStream;
-    return html::kAttrSkip;
-  }
-  void attributeValue(std::string_view value) { valueBytes += value.size(); }
-  void attributeChar(char) { ++valueBytes; }
-  Sink* commentSink() { return &comments; }
-  void scriptText(const char*, std::size_t n) { scriptBytes += n; }
-
-  std::size_t elements = 0;
-  std::size_t textBytes = 0;
-  std::size_t valueBytes = 0;
-  std::size_t scriptBytes = 0;
-  Sink comments;
-};
-
-constexpr std::size_t kChunk = 4096;  // the size the web session hands over
+using bench_scan::AnalyserLikeHandler;
+using bench_scan::kChunk;
 
 void TokenizeDocuments(benchmark::State& state, const std::vector<std::string>& documents) {
   std::size_t bytes = 0;

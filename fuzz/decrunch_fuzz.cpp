@@ -1,6 +1,7 @@
-// The fuzzer's bytes are a page. It runs through the whole decrunch pipeline twice, whole and
-// cut into pieces whose sizes come from the page's first byte, and the receiver's calls must
-// be the same both ways. Nesting, sinks and element strings are exercised on every input.
+// The fuzzer's bytes are a page. It runs through the whole decrunch pipeline three times:
+// whole, cut into pieces whose sizes come from the page's first byte, and whole with the bulk
+// paths off (every byte through its state's process), and the receiver's calls must be the
+// same every way. Nesting, sinks and element strings are exercised on every input.
 #include <cstddef>
 #include <cstdint>
 #include <cstdlib>
@@ -8,6 +9,7 @@
 #include <string_view>
 
 #include "engine/html/decrunch.h"
+#include "engine/html/state_machine.h"
 
 namespace {
 
@@ -95,6 +97,11 @@ std::uint64_t Run(const std::uint8_t* data, std::size_t size, std::size_t piece)
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   if (size == 0) return 0;
   const std::size_t piece = 1 + data[0] % 13;
-  if (Run(data + 1, size - 1, size) != Run(data + 1, size - 1, piece)) std::abort();
+  const std::uint64_t whole = Run(data + 1, size - 1, size);
+  if (whole != Run(data + 1, size - 1, piece)) std::abort();
+  util::setBulkScanning(false);
+  const std::uint64_t bytewise = Run(data + 1, size - 1, size);
+  util::setBulkScanning(true);
+  if (whole != bytewise) std::abort();
   return 0;
 }

@@ -174,6 +174,11 @@ def main():
         write(os.path.join(out, "pdf_scan_fuzz", name), PIECE + pdf)
     for name, model in MODELS.items():
         write(os.path.join(out, "deep_solver_fuzz", name), model)
+    # The mail walk starts from the hand-made test messages (one mbox among them).
+    mail = os.path.join(ROOT, "tests", "data", "mail")
+    for name in sorted(os.listdir(mail)):
+        with open(os.path.join(mail, name), "rb") as f:
+            write(os.path.join(out, "mail_walk_fuzz", name.replace(".", "_")), PIECE + f.read())
 
     with tempfile.TemporaryDirectory() as work:
         example = os.path.join(work, "example.kb")

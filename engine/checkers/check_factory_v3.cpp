@@ -3,11 +3,14 @@
 #include <stdexcept>
 
 #include "engine/checkers/web_checker_v3.h"
+#include "engine/common/trace.h"
 #include "engine/kb/kb_loader.h"
 
 namespace easy3_impl {
 
 std::shared_ptr<const WebCheckerV3Data> CheckFactoryV3::Load(std::shared_ptr<ap::FileIO> file) {
+  // The readers trace what they load at the host's level of now.
+  ap::RefreshEngineTraceLevels();
   auto knowledge = std::make_shared<WebCheckerV3Data>();
   loaders_misc::load(*knowledge, std::move(file));
   return knowledge;

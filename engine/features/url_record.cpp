@@ -70,19 +70,23 @@ void HostChannels(const std::string& host, const LexemeDB& lexemes, UrlRecord& r
 
 // A share link is listed by its host and a path; a URL below that path is shared content
 // too (a form or a document under a listed prefix), so the path and each of its parents
-// are tried, the query and fragment left out.
+// are tried, the query and fragment left out. The root "/" is the last parent: a host
+// listed with "/" publishes users' content under every path.
 bool IsShareLinkBelow(ap::WhiteDomainI& lookup, const std::string& host, std::string_view path) {
   path = path.substr(0, path.find_first_of("?#"));
+  const auto listed = [&](std::string_view p) {
+    return lookup.IsShareLink(host.data(), host.data() + host.size(), p.data(),
+                              p.data() + p.size());
+  };
   for (int step = 0; step < kMaxShareLinkSteps && !path.empty(); ++step) {
-    if (lookup.IsShareLink(host.data(), host.data() + host.size(), path.data(),
-                           path.data() + path.size()))
-      return true;
+    if (listed(path)) return true;
     if (path.size() > 1 && path.back() == '/') {
       path.remove_suffix(1);
       continue;
     }
     const std::size_t slash = path.rfind('/');
-    if (slash == std::string_view::npos || slash == 0) break;
+    if (slash == std::string_view::npos) break;
+    if (slash == 0) return path.size() > 1 && listed(path.substr(0, 1));
     path = path.substr(0, slash);
   }
   return false;

@@ -36,6 +36,12 @@ class Decoder : public Base {
     }
     return util::Stay();
   }
+  // No byte ever ends the data.
+  static constexpr bool kBulk = true;
+  const std::uint8_t* consume(const std::uint8_t* p, const std::uint8_t* end) override {
+    for (; p < end; ++p) process(*p);
+    return end;
+  }
 
  private:
   std::uint32_t bits_ = 0;  // only the low `held_` bits are pending

@@ -3,6 +3,7 @@
 #pragma once
 
 #include <cstdint>
+#include <string_view>
 
 namespace html {
 
@@ -24,6 +25,16 @@ constexpr int hexDigitValue(std::uint8_t b) {
   if (b >= 'a' && b <= 'f') return b - 'a' + 10;
   if (b >= 'A' && b <= 'F') return b - 'A' + 10;
   return -1;
+}
+
+// A name of at most 7 bytes packed into one integer (its length in the top bits), so that looking a
+// tag name up in a short table costs integer comparisons instead of string comparisons. Longer
+// names give 0, which no packed name equals.
+constexpr std::uint64_t packName(std::string_view name) {
+  if (name.empty() || name.size() > 7) return 0;
+  std::uint64_t key = 0;
+  for (const char c : name) key = (key << 8) | static_cast<std::uint8_t>(c);
+  return key | (std::uint64_t{name.size()} << 60);
 }
 
 }  // namespace html

@@ -4,6 +4,7 @@
 
 #include "engine/common/error.h"
 #include "engine/html/base64_decoder.h"
+#include "engine/html/byte_scan.h"
 #include "engine/html/char_class.h"
 
 namespace utils {
@@ -17,13 +18,24 @@ using util::Transition;
 class DataUrlMachine::WaitHeaderState final : public state_t {
  public:
   Transition process(std::uint8_t b) override {
-    static constexpr std::string_view kScheme = "data:";
-    if (b != static_cast<std::uint8_t>(kScheme[matched_])) ap::ThrowError(kHeaderError);
+    if (b != expected()) {
+      ++machine().rejected_;
+      return Stay();
+    }
     if (++matched_ < kScheme.size()) return Stay();
     return Push<ParseHeader>(machine());
   }
+  // Every byte up to the next expected one is rejected.
+  static constexpr bool kBulk = true;
+  const std::uint8_t* consume(const std::uint8_t* p, const std::uint8_t* end) override {
+    const std::uint8_t* stop = html::findByte(p, end, expected());
+    machine().rejected_ += static_cast<std::size_t>(stop - p);
+    return stop;
+  }
 
  private:
+  static constexpr std::string_view kScheme = "data:";
+  std::uint8_t expected() const { return static_cast<std::uint8_t>(kScheme[matched_]); }
   std::size_t matched_ = 0;
 };
 
@@ -67,6 +79,12 @@ class DataUrlMachine::DecodePercentage final : public state_t {
     machine().output(b);
     return Stay();
   }
+  static constexpr bool kBulk = true;
+  const std::uint8_t* consume(const std::uint8_t* p, const std::uint8_t* end) override {
+    const std::uint8_t* stop = html::findByte(p, end, '%');
+    for (; p < stop; ++p) machine().output(*p);
+    return stop;
+  }
 };
 
 // After '%': two hexadecimal digits make one byte; anything else passes through as written.
@@ -97,6 +115,18 @@ class DataUrlMachine::HexPair final : public state_t {
 
 DataUrlMachine::DataUrlMachine(Handler& handler) : handler_(&handler) {
   pushState<WaitHeaderState>();
+}
+
+void DataUrlMachine::feed(std::uint8_t byte) {
+  const std::size_t before = rejected_;
+  feedByte(byte);
+  if (rejected_ != before) ap::ThrowError(kHeaderError);
+}
+
+std::size_t DataUrlMachine::offer(const char* data, std::size_t length) {
+  const std::size_t before = rejected_;
+  Engine::feed(data, length);
+  return rejected_ - before;
 }
 
 }  // namespace utils

@@ -1,8 +1,9 @@
 // Decodes a "data:" URL byte by byte as it streams out of a page (the target of a meta
 // refresh) and hands every decoded byte to its handler: base64 when the last header token is
 // "base64", percent-decoding otherwise. A URL that is not a data URL yields nothing: each
-// byte that does not continue "data:" raises an error the caller is expected to swallow, and
-// later bytes are compared with the same expected byte, so junk before the scheme is skipped.
+// byte that does not continue "data:" is rejected, and later bytes are compared with the same
+// expected byte, so junk before the scheme is skipped. Rejection is a state, not an error:
+// offer() counts rejected bytes; only the one-byte feed() raises an error for them.
 #pragma once
 
 #include <cstddef>
@@ -32,10 +33,16 @@ class DataUrlMachine : public util::StateMachine<char, DataUrlMachine> {
 
   explicit DataUrlMachine(Handler& handler);
 
-  // One byte through the machine; throws ap::Error (kHeaderError) before the scheme is
-  // complete. The machine stays usable after the error.
-  void feed(std::uint8_t byte) { feedByte(byte); }
-  using Engine::feed;
+  // One byte through the machine; throws ap::Error (kHeaderError) for a byte that does not
+  // continue the scheme. The machine stays usable after the error.
+  void feed(std::uint8_t byte);
+  // Bytes through the machine; answers how many of them the scheme rejected. Never throws
+  // for a rejected byte.
+  std::size_t offer(const char* data, std::size_t length);
+  // Whether the scheme is still incomplete (only then can a byte be rejected).
+  bool inHeader() const { return depth() == 1; }
+  // Bytes rejected so far.
+  std::size_t rejected() const { return rejected_; }
 
   // "text/plain" unless the header names a media type.
   const std::string& mediaType() const { return mediaType_; }
@@ -52,6 +59,7 @@ class DataUrlMachine : public util::StateMachine<char, DataUrlMachine> {
 
   Handler* handler_;
   std::string mediaType_ = "text/plain";
+  std::size_t rejected_ = 0;
 };
 
 }  // namespace utils

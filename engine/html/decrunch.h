@@ -36,6 +36,8 @@ class Decrunch : public DecrunchInterfaces {
   // reached kMaxDecrunchNesting.
   struct NestedIn {
     std::size_t parentDepth;
+    // The owner has told the receiver beginNested already (it builds the pipeline late).
+    bool announced = false;
   };
   Decrunch(Handler& receiver, NestedIn parent);
 

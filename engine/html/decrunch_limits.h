@@ -24,6 +24,9 @@ inline constexpr std::size_t kMinScriptUrlBytes = 4;
 // bounded amount of memory and every end tag a bounded amount of work.
 inline constexpr std::size_t kMaxOpenElements = 4096;
 inline constexpr std::size_t kMaxOpenElementNameBytes = 64 * 1024;
+// Names of elements no longer open that the tracker keeps counting (at zero) so that the
+// usual elements do not cost an allocation each time they open.
+inline constexpr std::size_t kMaxIdleElementNames = 64;
 
 // The raw text of a meta refresh value and its fallback text keep at most this many bytes.
 inline constexpr std::size_t kMaxRefreshTextBytes = 16 * 1024;

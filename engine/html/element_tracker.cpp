@@ -51,7 +51,8 @@ std::vector<std::string> ElementTracker::openNames() const {
 }
 
 std::int64_t ElementTracker::topmost(std::string_view name) const {
-  if (openCount_.find(name) == openCount_.end()) return kNone;
+  const auto it = openCount_.find(name);
+  if (it == openCount_.end() || it->second == 0) return kNone;
   for (std::size_t i = records_.size(); i-- > 0;) {
     if (records_[i].name == name) return firstNumber_ + static_cast<std::int64_t>(i);
   }
@@ -77,7 +78,11 @@ void ElementTracker::push(std::string_view name, int kind) {
   records_.push_back(Record{std::string(name), kind});
   nameBytes_ += name.size();
   auto it = openCount_.find(name);
-  if (it == openCount_.end()) it = openCount_.emplace(std::string(name), 0).first;
+  if (it == openCount_.end()) {
+    it = openCount_.emplace(std::string(name), 0).first;
+  } else if (it->second == 0) {
+    --idleNames_;
+  }
   ++it->second;
   while (records_.size() > kMaxOpenElements || nameBytes_ > kMaxOpenElementNameBytes) {
     forgetOldest();
@@ -92,10 +97,18 @@ void ElementTracker::forgetOldest() {
   ++firstNumber_;
 }
 
+// A name whose count falls to zero keeps its entry while there are few, so that opening
+// and closing the same elements over and over allocates nothing; a page of ever new names
+// still holds no more entries than names open plus kMaxIdleElementNames.
 void ElementTracker::removeName(const std::string& name) {
   nameBytes_ -= name.size();
   const auto it = openCount_.find(name);
-  if (it != openCount_.end() && --it->second == 0) openCount_.erase(it);
+  if (it == openCount_.end() || --it->second != 0) return;
+  if (idleNames_ < kMaxIdleElementNames) {
+    ++idleNames_;
+  } else {
+    openCount_.erase(it);
+  }
 }
 
 }  // namespace html_decrunch

@@ -12,9 +12,10 @@
 #include <cstddef>
 #include <cstdint>
 #include <deque>
-#include <map>
+#include <functional>
 #include <string>
 #include <string_view>
+#include <unordered_map>
 #include <vector>
 
 namespace html_decrunch {
@@ -62,7 +63,16 @@ class ElementTracker {
   std::deque<Record> records_;
   std::int64_t firstNumber_ = 0;  // number of records_.front()
   std::size_t nameBytes_ = 0;
-  std::map<std::string, std::size_t, std::less<>> openCount_;
+  // Looked up by string_view without building a string.
+  struct NameHash {
+    using is_transparent = void;
+    std::size_t operator()(std::string_view name) const {
+      return std::hash<std::string_view>{}(name);
+    }
+  };
+  // Names open, and idle ones.
+  std::unordered_map<std::string, std::size_t, NameHash, std::equal_to<>> openCount_;
+  std::size_t idleNames_ = 0;                        // entries whose count is zero
   std::int64_t tracked_[3] = {kNone, kNone, kNone};  // a, button, select
   bool voidJustOpened_ = false;
   std::string voidName_;

@@ -7,9 +7,9 @@
 
 namespace html_decrunch {
 
-HtmlHandler::HtmlHandler(Receiver& receiver, std::size_t depth)
+HtmlHandler::HtmlHandler(Receiver& receiver, std::size_t depth, bool announce)
     : tracker_(*this), receiver_(receiver), chain_(receiver), collector_(chain_), depth_(depth) {
-  if (depth_ > 0) receiver_.beginNested();
+  if (depth_ > 0 && announce) receiver_.beginNested();
 }
 
 // Sinks are not ended and buffered text is not delivered: the document simply stopped. An
@@ -70,6 +70,15 @@ void HtmlHandler::attributeValue(std::string_view value) {
 
 void HtmlHandler::attributeChar(char byte) {
   if (charSlot_ != nullptr) (this->*charSlot_)(static_cast<std::uint8_t>(byte));
+}
+
+void HtmlHandler::attributeChars(const char* data, std::size_t length) {
+  if (charSlot_ == &HtmlHandler::refreshByte) {
+    refreshRun(data, length);
+    return;
+  }
+  if (charSlot_ == nullptr) return;
+  for (std::size_t i = 0; i < length; ++i) (this->*charSlot_)(static_cast<std::uint8_t>(data[i]));
 }
 
 void HtmlHandler::scriptText(const char* data, std::size_t length) {

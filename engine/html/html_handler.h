@@ -55,8 +55,9 @@ class HtmlHandler final : private ElementTracker::Listener {
   using HtmlInScript = html::Decrunch;
 
   // `depth` is the number of pipelines this one is nested in; a nested handler tells the
-  // receiver beginNested now and endNested when it is destroyed.
-  HtmlHandler(Receiver& receiver, std::size_t depth);
+  // receiver beginNested now (unless `announce` is false: its owner has done so) and
+  // endNested when it is destroyed.
+  HtmlHandler(Receiver& receiver, std::size_t depth, bool announce = true);
   ~HtmlHandler();
   HtmlHandler(const HtmlHandler&) = delete;
   HtmlHandler& operator=(const HtmlHandler&) = delete;
@@ -79,6 +80,8 @@ class HtmlHandler final : private ElementTracker::Listener {
   int attributeName(std::string_view name);
   void attributeValue(std::string_view value);
   void attributeChar(char byte);
+  // A run of streamed bytes: the same as attributeChar for each.
+  void attributeChars(const char* data, std::size_t length);
   TextHandler* commentSink() { return receiver_.commentSink(); }
   void scriptText(const char* data, std::size_t length);
 
@@ -139,6 +142,7 @@ class HtmlHandler final : private ElementTracker::Listener {
   void textByte(std::uint8_t byte);
   void descriptionByte(std::uint8_t byte);
   void refreshByte(std::uint8_t byte);
+  void refreshRun(const char* data, std::size_t length);
 
   void clearStrings();
 

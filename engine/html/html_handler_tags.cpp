@@ -2,6 +2,8 @@
 // keeps (collected whole or streamed byte by byte; every other attribute is skipped unread)
 // and what happens at the '>' of the start tag.
 #include <algorithm>
+#include <array>
+#include <cstdint>
 #include <iterator>
 
 #include "engine/html/char_class.h"
@@ -56,10 +58,16 @@ const HtmlHandler::TagRow* HtmlHandler::findTag(std::string_view name) {
   static_assert(std::size(kTags) == 22);
   static_assert(std::is_sorted(std::begin(kTags), std::end(kTags),
                                [](const TagRow& a, const TagRow& b) { return a.name < b.name; }));
-  const TagRow* row =
-      std::lower_bound(std::begin(kTags), std::end(kTags), name,
-                       [](const TagRow& r, std::string_view n) { return r.name < n; });
-  return row != std::end(kTags) && row->name == name ? row : nullptr;
+  // Looked up packed: every start tag of a page comes here.
+  static constexpr auto kKeys = [] {
+    std::array<std::uint64_t, std::size(kTags)> keys{};
+    for (std::size_t i = 0; i < keys.size(); ++i) keys[i] = html::packName(kTags[i].name);
+    return keys;
+  }();
+  const std::uint64_t key = html::packName(name);
+  if (key == 0) return nullptr;
+  const auto* hit = std::find(kKeys.begin(), kKeys.end(), key);
+  return hit != kKeys.end() ? &kTags[hit - kKeys.begin()] : nullptr;
 }
 
 // --- what an attribute is for -------------------------------------------------------------
@@ -116,6 +124,23 @@ void HtmlHandler::refreshByte(std::uint8_t byte) {
       break;
     case RefreshParser::Step::kNone:
       break;
+  }
+}
+
+// A refresh value in runs: once the parser has reached the target (or given up) the rest of
+// the run goes on as a whole.
+void HtmlHandler::refreshRun(const char* data, std::size_t length) {
+  while (length > 0) {
+    if (refresh_.inTarget()) {
+      if (metaUrl_ != nullptr) metaUrl_->feed(data, length);
+      return;
+    }
+    if (refresh_.gaveUp()) {
+      refresh_.addFallback(data, length);
+      return;
+    }
+    refreshByte(static_cast<std::uint8_t>(*data++));
+    --length;
   }
 }
 

@@ -1,9 +1,12 @@
 #include "engine/html/js_parser.h"
 
+#include <algorithm>
 #include <cstdint>
+#include <cstring>
 
 #include "engine/common/error.h"
 #include "engine/common/trace.h"
+#include "engine/html/byte_scan.h"
 #include "engine/html/char_class.h"
 #include "engine/html/entities.h"
 
@@ -19,6 +22,12 @@ struct JSQuote {
 struct JSDoubleQuote {
   static constexpr std::uint8_t kQuote = '"';
 };
+
+// Bytes of code that push a state; every other byte only decides whether a '/' after it
+// divides.
+constexpr html::ByteSet kCodeStops{"\"'/"};
+constexpr html::ByteSet kCodeBlanks{"\t\n\r "};
+constexpr html::ByteSet kOperatorEnds{"(,;="};
 
 }  // namespace
 
@@ -59,6 +68,18 @@ class JSParser<Char>::ScriptState final : public state_t {
         return Stay();
     }
   }
+  // Up to the next quote or '/': only the last byte that is not a blank counts.
+  static constexpr bool kBulk = true;
+  const std::uint8_t* consume(const std::uint8_t* p, const std::uint8_t* end) override {
+    const std::uint8_t* stop = kCodeStops.find(p, end);
+    for (const std::uint8_t* q = stop; q > p;) {
+      if (!kCodeBlanks.contains(*--q)) {
+        afterOperand_ = !kOperatorEnds.contains(*q);
+        break;
+      }
+    }
+    return stop;
+  }
 
  private:
   bool afterOperand_ = false;
@@ -81,6 +102,10 @@ template <typename Char>
 class JSParser<Char>::ScriptOLComment final : public state_t {
  public:
   Transition process(std::uint8_t b) override { return b == '\n' ? Pop(2) : Stay(); }
+  static constexpr bool kBulk = true;
+  const std::uint8_t* consume(const std::uint8_t* p, const std::uint8_t* end) override {
+    return html::findByte(p, end, '\n');
+  }
 };
 
 template <typename Char>
@@ -90,6 +115,12 @@ class JSParser<Char>::ScriptMLComment final : public state_t {
     if (b == '/' && afterStar_) return Pop(2);
     afterStar_ = b == '*';
     return Stay();
+  }
+  static constexpr bool kBulk = true;
+  const std::uint8_t* consume(const std::uint8_t* p, const std::uint8_t* end) override {
+    const std::uint8_t* stop = html::findByte(p, end, '/');
+    if (stop != p) afterStar_ = stop[-1] == '*';
+    return stop;
   }
 
  private:
@@ -139,6 +170,20 @@ class JSParser<Char>::ScriptStringState final : public state_t {
     }
     if (count_ == kStringChunkBytes) flush();
     return Stay();
+  }
+  // Up to the closing quote or a backslash, flushing whenever the buffer fills.
+  static constexpr bool kBulk = true;
+  const std::uint8_t* consume(const std::uint8_t* p, const std::uint8_t* end) override {
+    const std::uint8_t* stop = html::findEither(p, end, Quote::kQuote, '\\');
+    for (const std::uint8_t* q = p; q < stop;) {
+      const std::size_t n =
+          std::min(static_cast<std::size_t>(stop - q), kStringChunkBytes - count_);
+      std::memcpy(buffer_ + count_, q, n);
+      count_ += n;
+      q += n;
+      if (count_ == kStringChunkBytes) flush();
+    }
+    return stop;
   }
   void finish() override { flush(); }
 

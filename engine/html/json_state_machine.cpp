@@ -2,6 +2,8 @@
 
 #include <cstdint>
 
+#include "engine/html/byte_scan.h"
+
 namespace utils {
 namespace {
 
@@ -22,6 +24,8 @@ template <typename Char>
 class JSONStateMachine<Char>::WrongState final : public state_t {
  public:
   Transition process(std::uint8_t) override { return Stay(); }
+  static constexpr bool kBulk = true;
+  const std::uint8_t* consume(const std::uint8_t*, const std::uint8_t* end) override { return end; }
 };
 
 // Counts the open arrays and objects for the nesting limit.
@@ -161,6 +165,10 @@ class JSONStateMachine<Char>::StringState final : public state_t {
       return Pop(Kind == 0 ? 1 : 2);
     }
     return Stay();
+  }
+  static constexpr bool kBulk = true;
+  const std::uint8_t* consume(const std::uint8_t* p, const std::uint8_t* end) override {
+    return escape_ ? p : html::findEither(p, end, '"', '\\');
   }
 
  private:

@@ -1,6 +1,10 @@
 // The target of a meta refresh, decoded as a data URL as it streams in; the decoded bytes
 // are a document of their own and run through a nested pipeline that reports to the same
 // receiver. A target that is not a data URL yields nothing.
+//
+// The receiver hears beginNested when the decoder is made and endNested when it goes, as for
+// any nested pipeline; the pipeline itself is only built once the URL yields its first byte,
+// so the ordinary refreshes of a page cost no pipeline each.
 #pragma once
 
 #include <cstddef>
@@ -20,16 +24,23 @@ class HtmlHandler::DecrunchMetaUrl final : private utils::DataUrlMachine::Handle
   DecrunchMetaUrl(const DecrunchMetaUrl&) = delete;
   DecrunchMetaUrl& operator=(const DecrunchMetaUrl&) = delete;
 
-  // One byte of the target. A failure stops this byte and is swallowed; after
-  // kMaxMetaUrlRejectedBytes failures the decoder takes no more bytes.
-  void feed(std::uint8_t byte);
+  // Bytes of the target. After kMaxMetaUrlRejectedBytes bytes that did not continue "data:"
+  // the decoder takes no more.
+  void feed(std::uint8_t byte) { feed(reinterpret_cast<const char*>(&byte), 1); }
+  void feed(const char* data, std::size_t length);
 
  private:
   void byte(std::uint8_t b) override;
+  void handOver();
 
-  std::unique_ptr<html::Decrunch> page_;
+  Receiver& receiver_;
+  std::size_t parentDepth_;
+  std::unique_ptr<html::Decrunch> page_;  // built at the first decoded byte
   utils::DataUrlMachine decoder_;
   std::size_t rejected_ = 0;
+  // Decoded bytes of one feed call, handed to the page together.
+  char decoded_[1024];
+  std::size_t decodedCount_ = 0;
 };
 
 }  // namespace html_decrunch

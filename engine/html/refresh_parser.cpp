@@ -1,5 +1,7 @@
 #include "engine/html/refresh_parser.h"
 
+#include <algorithm>
+
 #include "engine/html/char_class.h"
 #include "engine/html/decrunch_limits.h"
 
@@ -66,6 +68,11 @@ RefreshParser::Step RefreshParser::feed(std::uint8_t b) {
       break;
   }
   return Step::kNone;
+}
+
+void RefreshParser::addFallback(const char* data, std::size_t length) {
+  const std::size_t room = kMaxRefreshTextBytes - std::min(kMaxRefreshTextBytes, fallback_.size());
+  fallback_.append(data, std::min(length, room));
 }
 
 void RefreshParser::giveUp() {

@@ -22,6 +22,13 @@ class RefreshParser {
   void reset();
   Step feed(std::uint8_t byte);
 
+  // Whether every later byte is a byte of the target (feed answers kUrl), or of the fallback
+  // text (feed answers kNone).
+  bool inTarget() const { return state_ == State::kTarget; }
+  bool gaveUp() const { return state_ == State::kGaveUp; }
+  // After giving up: the same as feed for each byte.
+  void addFallback(const char* data, std::size_t length);
+
   const std::string& fallback() const { return fallback_; }
   void clearFallback() { fallback_.clear(); }
 

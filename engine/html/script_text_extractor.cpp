@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cstring>
 
+#include "engine/html/byte_scan.h"
 #include "engine/html/char_class.h"
 
 namespace html_decrunch {
@@ -28,8 +29,14 @@ bool isUrlByte(std::uint8_t b) {
 
 void ScriptUrlFinder::feed(const char* data, std::size_t length) {
   static constexpr char kSeparator[] = "://";
+  const auto* const bytes = reinterpret_cast<const std::uint8_t*>(data);
   for (std::size_t i = 0; i < length; ++i) {
-    const std::uint8_t b = static_cast<std::uint8_t>(data[i]);
+    // Waiting for a ':' with nothing matched: no byte before it changes anything.
+    if (!inRun_ && separator_ == 0) {
+      i = static_cast<std::size_t>(html::findByte(bytes + i, bytes + length, ':') - bytes);
+      if (i == length) break;
+    }
+    const std::uint8_t b = bytes[i];
     if (inRun_) {
       if (isUrlByte(b)) {
         if (runBytes_ < kScriptUrlBytes) url_[runBytes_] = static_cast<char>(b);
@@ -77,7 +84,18 @@ void ScriptTextExtractor::finish() {
 }
 
 void ScriptTextExtractor::text(const char* data, std::size_t length) {
-  for (std::size_t i = 0; i < length; ++i) decode(static_cast<std::uint8_t>(data[i]));
+  const auto* p = reinterpret_cast<const std::uint8_t*>(data);
+  const auto* const end = p + length;
+  while (p < end) {
+    // Outside an escape, everything up to the next '%' is copied as it is.
+    if (escape_ == 0) {
+      const std::uint8_t* stop = html::findByte(p, end, '%');
+      appendRun(p, static_cast<std::size_t>(stop - p));
+      p = stop;
+      if (p == end) break;
+    }
+    decode(*p++);
+  }
 }
 
 void ScriptTextExtractor::decode(std::uint8_t b) {
@@ -112,6 +130,21 @@ void ScriptTextExtractor::append(std::uint8_t b) {
   if (count_ == kScriptTextBytes) handOver();
   buffer_[count_++] = static_cast<char>(b);
   if (count_ > kScriptHandOverBytes && escape_ == 0) handOver();
+}
+
+// The same as append for each byte, with no escape pending.
+void ScriptTextExtractor::appendRun(const std::uint8_t* data, std::size_t length) {
+  while (length > 0) {
+    if (count_ == kScriptTextBytes) handOver();
+    // append hands over as soon as the buffer holds more than kScriptHandOverBytes.
+    const std::size_t room = count_ > kScriptHandOverBytes ? 1 : kScriptHandOverBytes + 1 - count_;
+    const std::size_t n = std::min(length, room);
+    std::memcpy(buffer_ + count_, data, n);
+    count_ += n;
+    data += n;
+    length -= n;
+    if (count_ > kScriptHandOverBytes) handOver();
+  }
 }
 
 void ScriptTextExtractor::handOver() {

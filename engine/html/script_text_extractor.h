@@ -52,6 +52,7 @@ class ScriptTextExtractor final : private ap::JSParser<char>::Handler {
   void text(const char* data, std::size_t length) override;
   void decode(std::uint8_t byte);
   void append(std::uint8_t byte);
+  void appendRun(const std::uint8_t* data, std::size_t length);
   void handOver();
 
   TextHandler& output_;

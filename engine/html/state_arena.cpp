@@ -12,17 +12,7 @@ StateArena::~StateArena() {
   ::operator delete(spare_.base);
 }
 
-void* StateArena::allocate(std::size_t size) {
-  size = std::max<std::size_t>(size, 1);
-  size = (size + kAlignment - 1) / kAlignment * kAlignment;
-  if (count_ > 0) {
-    Block& current = blocks_[count_ - 1];
-    if (current.size - current.used >= size) {
-      void* p = current.base + current.used;
-      current.used += size;
-      return p;
-    }
-  }
+void* StateArena::allocateBlock(std::size_t size) {
   if (count_ == kMaxBlocks) throw std::runtime_error("StateMachine: state arena exhausted");
   const std::size_t blockSize = count_ == 0
                                     ? kFirstBlockFactor * size
@@ -41,18 +31,13 @@ void* StateArena::allocate(std::size_t size) {
   return block.base;
 }
 
-void StateArena::release(void* p) {
+void StateArena::releaseBlock() {
   assert(count_ > 0);
   Block& current = blocks_[count_ - 1];
-  auto* position = static_cast<std::byte*>(p);
-  assert(position >= current.base && position < current.base + current.used);
-  current.used = static_cast<std::size_t>(position - current.base);
-  if (current.used == 0) {
-    ::operator delete(spare_.base);
-    spare_ = current;
-    current = Block{};
-    --count_;
-  }
+  ::operator delete(spare_.base);
+  spare_ = current;
+  current = Block{};
+  --count_;
 }
 
 }  // namespace util

@@ -5,6 +5,7 @@
 // input pushing and popping right at a block edge does not allocate on every byte.
 #pragma once
 
+#include <cassert>
 #include <cstddef>
 
 namespace util {
@@ -26,9 +27,28 @@ class StateArena {
 
   // Throws std::runtime_error "StateMachine: state arena exhausted" when the request fits in
   // no block and all kMaxBlocks are in use.
-  void* allocate(std::size_t size);
+  void* allocate(std::size_t size) {
+    // Every push comes here; the common case (room in the current block) stays inline.
+    size = size == 0 ? kAlignment : (size + kAlignment - 1) / kAlignment * kAlignment;
+    if (count_ > 0) {
+      Block& current = blocks_[count_ - 1];
+      if (current.size - current.used >= size) {
+        void* p = current.base + current.used;
+        current.used += size;
+        return p;
+      }
+    }
+    return allocateBlock(size);
+  }
   // `p` must be the most recent allocation still live.
-  void release(void* p);
+  void release(void* p) {
+    assert(count_ > 0);
+    Block& current = blocks_[count_ - 1];
+    assert(static_cast<std::byte*>(p) >= current.base &&
+           static_cast<std::byte*>(p) < current.base + current.used);
+    current.used = static_cast<std::size_t>(static_cast<std::byte*>(p) - current.base);
+    if (current.used == 0) releaseBlock();
+  }
 
   std::size_t blockCount() const { return count_; }
   std::size_t blockSize(std::size_t index) const { return blocks_[index].size; }
@@ -41,6 +61,9 @@ class StateArena {
     std::size_t size = 0;
     std::size_t used = 0;
   };
+  void* allocateBlock(std::size_t size);  // `size` already rounded
+  void releaseBlock();                    // the current block is empty
+
   Block blocks_[kMaxBlocks];
   std::size_t count_ = 0;  // blocks in use; the last one is current
   Block spare_;            // the last block given up, kept for reuse

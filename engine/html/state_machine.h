@@ -2,8 +2,14 @@
 // of state objects; each input byte goes to the top state, whose answer (a transition) may
 // push a new state, pop states, and ask for the same byte to be offered again to the new top.
 // Scanners never look back: everything they remember lives in their states.
+//
+// Most bytes of a document change nothing but the top state's own fields (text, attribute
+// values, comments, script bodies). A state that declares `static constexpr bool kBulk = true`
+// overrides consume() to take such a run in one call; feed() offers it every run, and the
+// events stay exactly those of the byte-at-a-time machine whatever the chunking.
 #pragma once
 
+#include <atomic>
 #include <cstddef>
 #include <cstdint>
 #include <new>
@@ -27,6 +33,13 @@ constexpr Transition Stay() { return {}; }
 constexpr Transition Pop(std::uint8_t n) { return {n, false}; }
 constexpr Transition PopReprocess(std::uint8_t n) { return {n, true}; }
 
+// Whether feed() takes the bulk paths; on by default. Turned off, every byte goes through
+// process(), which makes the byte-at-a-time machine the reference the bulk paths are tested
+// against. Read once per feed() call.
+inline std::atomic<bool> gBulkScanning{true};
+inline void setBulkScanning(bool on) { gBulkScanning.store(on, std::memory_order_relaxed); }
+inline bool bulkScanning() { return gBulkScanning.load(std::memory_order_relaxed); }
+
 // Machine is the concrete machine (CRTP); its states reach it through State::machine().
 template <typename Char, typename Machine>
 class StateMachine {
@@ -38,15 +51,25 @@ class StateMachine {
    public:
     virtual Transition process(Byte byte) = 0;
     virtual ~State() = default;
+    // The bulk path of a state that declares kBulk: consumes the longest prefix of
+    // [data, end) that process() would take byte by byte without a transition, with the same
+    // effects and the same calls, and returns where it stopped. The byte it stops at goes to
+    // process().
+    virtual const Byte* consume(const Byte* data, const Byte*) { return data; }
 
-    State* below() const { return below_; }
+    State* below() const { return reinterpret_cast<State*>(below_ & ~kBulkBit); }
     Machine& machine() const { return *machine_; }
 
    private:
     friend class StateMachine;
-    State* below_ = nullptr;
+    // States sit at aligned addresses, so the lowest bit of the pointer to the state below
+    // is free to say whether this state has a bulk path (a state stays this small).
+    static constexpr std::uintptr_t kBulkBit = 1;
+    bool bulk() const { return (below_ & kBulkBit) != 0; }
+    std::uintptr_t below_ = 0;
     Machine* machine_ = nullptr;
   };
+  static_assert(StateArena::kAlignment > 1);
 
   // A state that collects bytes and hands them on in pieces.
   class BufferedState : public State {
@@ -62,7 +85,19 @@ class StateMachine {
   StateMachine& operator=(const StateMachine&) = delete;
 
   void feed(const Char* data, std::size_t length) {
-    for (std::size_t i = 0; i < length; ++i) feedByte(static_cast<Byte>(data[i]));
+    const Byte* p = reinterpret_cast<const Byte*>(data);
+    const Byte* const end = p + length;
+    if (!bulkScanning()) {
+      while (p < end) feedByte(*p++);
+      return;
+    }
+    while (p < end) {
+      if (top_->bulk()) {
+        p = top_->consume(p, end);
+        if (p == end) break;
+      }
+      feedByte(*p++);
+    }
   }
 
   void feedByte(Byte byte) {
@@ -86,12 +121,22 @@ class StateMachine {
     void* storage = arena_.allocate(sizeof(S));
     S* state;
     try {
-      state = ::new (storage) S(std::forward<Args>(args)...);
+      // Default-initialised, not value-initialised: states hold fixed buffers of a kilobyte
+      // or more, which must not be zeroed on every push (every field that is read has its
+      // own initialiser).
+      if constexpr (sizeof...(Args) == 0) {
+        state = ::new (storage) S;
+      } else {
+        state = ::new (storage) S(std::forward<Args>(args)...);
+      }
     } catch (...) {
       arena_.release(storage);
       throw;
     }
-    state->below_ = top_;
+    state->below_ = reinterpret_cast<std::uintptr_t>(top_);
+    if constexpr (requires { S::kBulk; }) {
+      if (S::kBulk) state->below_ |= State::kBulkBit;
+    }
     state->machine_ = static_cast<Machine*>(this);
     top_ = state;
     ++depth_;
@@ -108,7 +153,7 @@ class StateMachine {
  private:
   void destroyTop() {
     State* state = top_;
-    top_ = state->below_;
+    top_ = state->below();
     --depth_;
     void* storage = dynamic_cast<void*>(state);  // the most derived object, as allocated
     state->~State();

@@ -14,6 +14,7 @@
 #include <string_view>
 #include <type_traits>
 
+#include "engine/html/byte_scan.h"
 #include "engine/html/char_class.h"
 #include "engine/html/state_machine.h"
 #include "engine/html/tokenizer_handler.h"
@@ -28,6 +29,7 @@ class FastParserMachine
   static_assert(std::is_same_v<Char, char>, "the tokenizer reads 8-bit markup");
   using Engine = util::StateMachine<Char, FastParserMachine>;
   using Byte = typename Engine::Byte;
+  static_assert(std::is_same_v<Byte, ScanByte>);
   using StringView = std::basic_string_view<Char>;
   using Transition = util::Transition;
 
@@ -109,6 +111,13 @@ class FastParserMachine
       }
       buffer_.append(b, flush);
       return util::Stay();
+    }
+    static constexpr bool kBulk = true;
+    const Byte* consume(const Byte* p, const Byte* end) override {
+      const Byte* stop = findByte(p, end, '<');
+      buffer_.appendRun(p, static_cast<std::size_t>(stop - p),
+                        [this](const Char* data, std::size_t n) { this->flush(data, n); });
+      return stop;
     }
     void flush(const Char* data, std::size_t n) override {
       Config::text(this->machine().handler(), data, n);
@@ -235,14 +244,26 @@ class FastParserMachine
         buffer_.flushIfAny(flush);
         CommentSink* sink = sink_;
         sink_ = nullptr;
-        Config::commentEnd(*sink);
+        if (sink != nullptr) Config::commentEnd(*sink);
         return util::Pop(3);
       }
       end_.shift(b);
       buffer_.append(b, flush);
       return util::Stay();
     }
-    void flush(const Char* data, std::size_t n) override { Config::commentText(*sink_, data, n); }
+    // Only a '>' can end a comment.
+    static constexpr bool kBulk = true;
+    const Byte* consume(const Byte* p, const Byte* end) override {
+      const Byte* stop = findByte(p, end, '>');
+      const std::size_t n = static_cast<std::size_t>(stop - p);
+      end_.shiftRun(p, n);
+      buffer_.appendRun(p, n, [this](const Char* data, std::size_t k) { this->flush(data, k); });
+      return stop;
+    }
+    // The sink is gone only when the receiver failed while the comment was ending.
+    void flush(const Char* data, std::size_t n) override {
+      if (sink_ != nullptr) Config::commentText(*sink_, data, n);
+    }
 
    private:
     CommentSink* sink_;
@@ -256,6 +277,12 @@ class FastParserMachine
       if (end_.closes(b)) return util::Pop(3);
       end_.shift(b);
       return util::Stay();
+    }
+    static constexpr bool kBulk = true;
+    const Byte* consume(const Byte* p, const Byte* end) override {
+      const Byte* stop = findByte(p, end, '>');
+      end_.shiftRun(p, static_cast<std::size_t>(stop - p));
+      return stop;
     }
 
    private:
@@ -299,6 +326,12 @@ class FastParserMachine
       name_.append(toLowerAscii(b));
       return util::Stay();
     }
+    static constexpr bool kBulk = true;
+    const Byte* consume(const Byte* p, const Byte* end) override {
+      const Byte* stop = kAttrNameEnd.find(p, end);
+      for (; p < stop; ++p) name_.append(toLowerAscii(*p));
+      return stop;
+    }
 
    private:
     Transition reportName(FastParserMachine& m, bool reprocess) {
@@ -328,6 +361,15 @@ class FastParserMachine
       last_ = b;
       atStart_ = false;
       return util::Stay();
+    }
+    static constexpr bool kBulk = true;
+    const Byte* consume(const Byte* p, const Byte* end) override {
+      const Byte* stop = kAttrNameEnd.find(p, end);
+      if (stop != p) {
+        last_ = stop[-1];
+        atStart_ = false;
+      }
+      return stop;
     }
 
    private:
@@ -379,6 +421,12 @@ class FastParserMachine
       value_.append(b);
       return util::Stay();
     }
+    static constexpr bool kBulk = true;
+    const Byte* consume(const Byte* p, const Byte* end) override {
+      const Byte* stop = kUnquotedEnd.find(p, end);
+      value_.appendRun(p, static_cast<std::size_t>(stop - p));
+      return stop;
+    }
 
    private:
     BoundedText<Char, kMaxAttributeValueBytes> value_;
@@ -395,6 +443,13 @@ class FastParserMachine
       if (b != '\n') value_.append(b);
       return util::Stay();
     }
+    // Runs end at the quote or at a line feed (which is dropped by process).
+    static constexpr bool kBulk = true;
+    const Byte* consume(const Byte* p, const Byte* end) override {
+      const Byte* stop = findEither(p, end, static_cast<Byte>(Q), '\n');
+      value_.appendRun(p, static_cast<std::size_t>(stop - p));
+      return stop;
+    }
 
    private:
     BoundedText<Char, kMaxAttributeValueBytes> value_;
@@ -409,6 +464,15 @@ class FastParserMachine
       if (b == '>') return util::PopReprocess(1);
       Config::attributeChar(m.handler(), static_cast<Char>(b));
       return util::Stay();
+    }
+    static constexpr bool kBulk = true;
+    const Byte* consume(const Byte* p, const Byte* end) override {
+      const Byte* stop = kStreamedEnd.find(p, end);
+      if (stop != p) {
+        Config::attributeChars(this->machine().handler(), reinterpret_cast<const Char*>(p),
+                               static_cast<std::size_t>(stop - p));
+      }
+      return stop;
     }
   };
 
@@ -434,6 +498,15 @@ class FastParserMachine
       if (b != '\n') Config::attributeChar(this->machine().handler(), static_cast<Char>(b));
       return util::Stay();
     }
+    static constexpr bool kBulk = true;
+    const Byte* consume(const Byte* p, const Byte* end) override {
+      const Byte* stop = findEither(p, end, static_cast<Byte>(Q), '\n');
+      if (stop != p) {
+        Config::attributeChars(this->machine().handler(), reinterpret_cast<const Char*>(p),
+                               static_cast<std::size_t>(stop - p));
+      }
+      return stop;
+    }
   };
 
   class AttrSkipValue final : public state_t {
@@ -447,6 +520,12 @@ class FastParserMachine
       last_ = b;
       return util::Stay();
     }
+    static constexpr bool kBulk = true;
+    const Byte* consume(const Byte* p, const Byte* end) override {
+      const Byte* stop = kUnquotedEnd.find(p, end);
+      if (stop != p) last_ = stop[-1];
+      return stop;
+    }
 
    private:
     Byte last_ = 0;
@@ -457,6 +536,10 @@ class FastParserMachine
    public:
     Transition process(Byte b) override {
       return b == static_cast<Byte>(Q) ? util::Pop(3) : util::Stay();
+    }
+    static constexpr bool kBulk = true;
+    const Byte* consume(const Byte* p, const Byte* end) override {
+      return findByte(p, end, static_cast<Byte>(Q));
     }
   };
 
@@ -470,6 +553,8 @@ class FastParserMachine
       if (toLowerAscii(b) == static_cast<Byte>(Trait::kLiteral[matched_])) {
         held_[matched_++] = b;
         if (matched_ < Trait::kLiteral.size()) return util::Stay();
+        // Reset first: a receiver that fails below must not leave the match past the end.
+        matched_ = 0;
         buffer_.flushIfAny(flush);
         Config::closeElement(this->machine().handler(), Trait::kName);
         return util::Pop(3);
@@ -483,6 +568,15 @@ class FastParserMachine
         buffer_.append(b, flush);
       }
       return util::Stay();
+    }
+    // Outside a partial match only a '<' can start the closing literal.
+    static constexpr bool kBulk = true;
+    const Byte* consume(const Byte* p, const Byte* end) override {
+      if (matched_ != 0) return p;
+      const Byte* stop = findByte(p, end, '<');
+      buffer_.appendRun(p, static_cast<std::size_t>(stop - p),
+                        [this](const Char* data, std::size_t n) { this->flush(data, n); });
+      return stop;
     }
     void flush(const Char* data, std::size_t n) override {
       if constexpr (Trait::kDelivers) Config::scriptText(this->machine().handler(), data, n);
@@ -500,16 +594,27 @@ class FastParserMachine
     Transition process(Byte b) override {
       if (toLowerAscii(b) == static_cast<Byte>(Trait::kLiteral[matched_])) {
         if (++matched_ < Trait::kLiteral.size()) return util::Stay();
+        matched_ = 0;
         Config::closeElement(this->machine().handler(), Trait::kName);
         return util::Pop(3);
       }
       matched_ = b == '<' ? 1 : 0;
       return util::Stay();
     }
+    static constexpr bool kBulk = true;
+    const Byte* consume(const Byte* p, const Byte* end) override {
+      return matched_ != 0 ? p : findByte(p, end, '<');
+    }
 
    private:
     std::size_t matched_ = 0;
   };
+
+  // Where an unquoted value ends (collected or skipped), and a streamed one ('/' may make the
+  // tag self-closing).
+  static constexpr ByteSet kUnquotedEnd{">", /*whitespace=*/true};
+  static constexpr ByteSet kAttrNameEnd{">=", /*whitespace=*/true};
+  static constexpr ByteSet kStreamedEnd{">/", /*whitespace=*/true};
 
   Handler* handler_;
   bool selfClosing_ = false;

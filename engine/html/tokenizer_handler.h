@@ -61,6 +61,15 @@ struct DefaultConfig {
   static int attributeName(Handler& h, StringView name) { return h.attributeName(name); }
   static void attributeValue(Handler& h, StringView value) { h.attributeValue(value); }
   static void attributeChar(Handler& h, Char byte) { h.attributeChar(byte); }
+  // A run of streamed bytes: one call when the handler takes runs (attributeChars), else
+  // one attributeChar per byte. Either way it must mean the same as the bytes one by one.
+  static void attributeChars(Handler& h, const Char* data, std::size_t n) {
+    if constexpr (requires { h.attributeChars(data, n); }) {
+      h.attributeChars(data, n);
+    } else {
+      for (std::size_t i = 0; i < n; ++i) h.attributeChar(data[i]);
+    }
+  }
   static CommentSink* commentSink(Handler& h) { return h.commentSink(); }
   static void commentText(CommentSink& sink, const Char* data, std::size_t n) {
     sink.text(data, n);

@@ -2,8 +2,10 @@
 // made of. Nothing here allocates per byte; only BoundedText grows, and only to its limit.
 #pragma once
 
+#include <algorithm>
 #include <cstddef>
 #include <cstdint>
+#include <cstring>
 #include <string>
 #include <string_view>
 
@@ -65,6 +67,15 @@ class BoundedText {
       truncated_ = true;
     }
   }
+  // The same as append for each byte of a run.
+  void appendRun(const std::uint8_t* data, std::size_t n) {
+    if (n == 0) return;
+    last_ = data[n - 1];
+    const std::size_t room = Limit - std::min(Limit, text_.size());
+    const std::size_t kept = std::min(n, room);
+    text_.append(reinterpret_cast<const Char*>(data), kept);
+    if (kept < n) truncated_ = true;
+  }
   bool empty() const { return text_.empty(); }
   bool endsWithSlash() const { return !text_.empty() && last_ == '/'; }
   void dropSlash() {
@@ -96,6 +107,21 @@ class ChunkBuffer {
       flush(data_, Size);
     }
   }
+  // The same as append for each byte of a run.
+  template <typename Flush>
+  void appendRun(const std::uint8_t* data, std::size_t n, Flush&& flush) {
+    while (n > 0) {
+      const std::size_t k = std::min(n, Size - count_);
+      std::memcpy(data_ + count_, data, k);
+      count_ += k;
+      data += k;
+      n -= k;
+      if (count_ == Size) {
+        count_ = 0;
+        flush(data_, Size);
+      }
+    }
+  }
   template <typename Flush>
   void flushIfAny(Flush&& flush) {
     if (count_ == 0) return;
@@ -116,6 +142,14 @@ class CommentEnd {
   void shift(std::uint8_t b) {
     prev2_ = prev1_;
     prev1_ = b;
+  }
+  void shiftRun(const std::uint8_t* data, std::size_t n) {
+    if (n >= 2) {
+      prev2_ = data[n - 2];
+      prev1_ = data[n - 1];
+    } else if (n == 1) {
+      shift(data[0]);
+    }
   }
 
  private:

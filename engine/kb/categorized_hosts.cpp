@@ -1,5 +1,8 @@
 #include "engine/kb/categorized_hosts.h"
 
+#include <algorithm>
+#include <cstring>
+
 #include "engine/common/error.h"
 #include "engine/common/trace.h"
 #include "engine/kb/md5.h"
@@ -25,13 +28,49 @@ std::string LowerAscii(const std::string& text) {
   return lower;
 }
 
+}  // namespace
+
+// The entry's bytes in kLoadBufferSize pieces. file_read gives what the entry itself would
+// give for the same request: the bytes asked for, fewer at its end, or the entry's failure
+// (a negative count) when nothing was buffered before it.
+class HashedCatHostsPathes::BufferedEntry {
+ public:
+  explicit BufferedEntry(ap::ReadableFileI& entry) : entry_(entry), buffer_(kLoadBufferSize) {}
+
+  std::int64_t file_read(void* out, std::size_t count) {
+    auto* to = static_cast<std::uint8_t*>(out);
+    std::size_t done = 0;
+    while (done < count) {
+      if (next_ == end_) {
+        const std::int64_t got = entry_.file_read(buffer_.data(), buffer_.size());
+        if (got <= 0) return done != 0 ? static_cast<std::int64_t>(done) : got;
+        next_ = 0;
+        end_ = static_cast<std::size_t>(got);
+      }
+      const std::size_t take = std::min(count - done, end_ - next_);
+      std::memcpy(to + done, buffer_.data() + next_, take);
+      next_ += take;
+      done += take;
+    }
+    return static_cast<std::int64_t>(done);
+  }
+
+ private:
+  ap::ReadableFileI& entry_;
+  std::vector<std::uint8_t> buffer_;
+  std::size_t next_ = 0;
+  std::size_t end_ = 0;
+};
+
+namespace {
+
 // Reads exactly `count` bytes; anything else (a zero count asked for included) fails.
-void ReadPayload(ap::ReadableFileI& entry, void* buffer, std::size_t count) {
+void ReadPayload(HashedCatHostsPathes::BufferedEntry& entry, void* buffer, std::size_t count) {
   const std::int64_t got = entry.file_read(buffer, count);
   if (count == 0 || got != static_cast<std::int64_t>(count)) ap::ThrowError("HDBP: Can't read");
 }
 
-void Skip(ap::ReadableFileI& entry, std::size_t count) {
+void Skip(HashedCatHostsPathes::BufferedEntry& entry, std::size_t count) {
   std::uint8_t chunk[kSkipChunk];
   while (count != 0) {
     const std::size_t want = count < kSkipChunk ? count : kSkipChunk;
@@ -48,12 +87,13 @@ HashedCatHostsPathes::HashedCatHostsPathes(std::shared_ptr<ap::ReadableFileI> en
     AP_TRACE(ap::kSeverityWarning) << "HPDB: null source results empty DB!";
     return;
   }
-  Load(*entry);
+  BufferedEntry buffered(*entry);
+  Load(buffered);
   current_ = nullptr;
   AP_TRACE(ap::kSeverityMessage) << "HPDB: " << hosts_.size() << " hosts loaded";
 }
 
-void HashedCatHostsPathes::Load(ap::ReadableFileI& entry) {
+void HashedCatHostsPathes::Load(BufferedEntry& entry) {
   for (;;) {
     std::uint8_t type = 0;
     const std::int64_t got = entry.file_read(&type, 1);

@@ -51,6 +51,10 @@ inline constexpr std::size_t kMaskPayloadSize = 8;
 inline constexpr std::size_t kPathCategorySize = 2;
 // Unknown payloads are skipped through a stack buffer of this size.
 inline constexpr std::size_t kSkipChunk = 1024;
+// The loader reads the entry through one buffer of this size: a database of real size holds
+// tens of thousands of sections of a few bytes, and one host-file read per field made its
+// load take hundreds of milliseconds.
+inline constexpr std::size_t kLoadBufferSize = 64 * 1024;
 
 class HashedCatHostsPathes final : public ap::CategorizedHostsPathesDB {
  public:
@@ -66,6 +70,9 @@ class HashedCatHostsPathes final : public ap::CategorizedHostsPathesDB {
   // The digest as two 64-bit halves, each read little-endian.
   using Key = std::pair<std::uint64_t, std::uint64_t>;
 
+  // The loader's reading buffer over the entry (defined beside the loader).
+  class BufferedEntry;
+
   // Reads the entry, which may be null (traced, empty database).
   explicit HashedCatHostsPathes(std::shared_ptr<ap::ReadableFileI> entry);
 
@@ -75,7 +82,7 @@ class HashedCatHostsPathes final : public ap::CategorizedHostsPathesDB {
   std::size_t host_count() const { return hosts_.size(); }
 
  private:
-  void Load(ap::ReadableFileI& entry);
+  void Load(BufferedEntry& entry);
 
   std::map<Key, Host> hosts_;
   Host* current_ = nullptr;  // the host of the last host section, while loading

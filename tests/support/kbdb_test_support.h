@@ -17,12 +17,14 @@
 namespace kbdb_test {
 
 // An opened entry over bytes it owns. `fail_after` makes every read fail (return -1) once
-// that many bytes have been delivered; `short_by` makes file_size report more than there is.
+// that many bytes have been delivered; `short_by` makes file_size report more than there is;
+// `max_read` (when not 0) hands out at most that many bytes a read, as a pipe would.
 class BytesEntry final : public ap::ReadableFileI {
  public:
   explicit BytesEntry(std::string bytes) : bytes_(std::move(bytes)) {}
   std::int64_t fail_after = -1;
   std::int64_t short_by = 0;
+  std::uint64_t max_read = 0;
 
   std::int64_t file_seek(std::int64_t position) override {
     if (position < 0 || static_cast<std::uint64_t>(position) >= bytes_.size()) return -1;
@@ -32,6 +34,7 @@ class BytesEntry final : public ap::ReadableFileI {
   std::int64_t file_size() override { return static_cast<std::int64_t>(bytes_.size()) + short_by; }
   std::int64_t file_read(void* buffer, std::uint64_t count) override {
     if (fail_after >= 0 && static_cast<std::int64_t>(position_) >= fail_after) return -1;
+    if (max_read != 0) count = std::min(count, max_read);
     const std::size_t n =
         static_cast<std::size_t>(std::min<std::uint64_t>(count, bytes_.size() - position_));
     if (n != 0) std::memcpy(buffer, bytes_.data() + position_, n);

@@ -67,6 +67,7 @@ void BuildKnowledgeBase(const fs::path& dir, const fs::path& skip, ContainerWrit
   for (const fs::directory_entry& file : fs::recursive_directory_iterator(dir)) {
     if (!file.is_regular_file()) continue;
     if (fs::equivalent(file.path(), skip, error)) continue;
+    if (file.path().extension() == kDocumentationExtension) continue;
     const std::string name = file.path().lexically_relative(dir).generic_string();
     const std::string shown = file.path().string();
     std::string data = ReadWholeFile(file.path());

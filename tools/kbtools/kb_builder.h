@@ -5,6 +5,7 @@
 //   categorised_hosts.txt   -> "sb.db" (CompileCategorisedHosts)
 //   any other regular file  -> an entry named by its path relative to the directory, with
 //                              "/" separators ("orgs", "lexdb.txt", "v3.cfg", models ...)
+//   *.md                    -> nothing: the sources' own documentation (README.md, CREDITS.md)
 // Only the two sources at the top of the directory are compiled. The engine cannot open an
 // entry of 0 bytes, so an empty "share_links.txt", "lexdb.txt" or "orgs" is packed as a
 // single line feed: the base then loads empty instead of failing the whole load.
@@ -26,6 +27,7 @@ std::string ReadWholeFile(const std::filesystem::path& path);
 
 inline constexpr char kWhiteDomainsSource[] = "white_domains.txt";
 inline constexpr char kCategorisedHostsSource[] = "categorised_hosts.txt";
+inline constexpr char kDocumentationExtension[] = ".md";
 
 // Fills `writer` from `dir`. A file equivalent to `skip` (the container being written, when
 // it lies inside the directory) is left out.

@@ -1,10 +1,9 @@
-// pelmix dump dataurl: the media type and the bytes the data-URL decoder hands on. Errors per
-// byte (bytes before a complete "data:") are swallowed, as the page decoder does.
+// pelmix dump dataurl: the media type and the bytes the data-URL decoder hands on. Bytes
+// before a complete "data:" are skipped, as the page decoder skips them.
 #include <iostream>
 #include <string>
 #include <string_view>
 
-#include "engine/common/error.h"
 #include "engine/html/data_url_machine.h"
 #include "tools/pelmix/command.h"
 #include "tools/pelmix/dump_input.h"
@@ -24,14 +23,7 @@ int RunDumpDataUrl(const std::vector<std::string>& args, const GlobalOptions&) {
   utils::DataUrlMachine decoder(output);
   return RunDumpOverInput(
       "dump dataurl", args,
-      [&](std::string_view chunk) {
-        for (const char c : chunk) {
-          try {
-            decoder.feed(static_cast<std::uint8_t>(c));
-          } catch (const ap::Error&) {
-          }
-        }
-      },
+      [&](std::string_view chunk) { decoder.offer(chunk.data(), chunk.size()); },
       [&] {
         JsonLine()
             .Bytes("media_type", decoder.mediaType())

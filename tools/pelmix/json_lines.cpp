@@ -50,6 +50,17 @@ JsonLine& JsonLine::Bool(std::string_view key, bool value) {
   return *this;
 }
 
+JsonLine& JsonLine::Strings(std::string_view key, const std::vector<std::string_view>& values) {
+  Key(key);
+  text_ += '[';
+  for (std::size_t i = 0; i < values.size(); ++i) {
+    if (i > 0) text_ += ',';
+    AppendJsonBytes(text_, values[i]);
+  }
+  text_ += ']';
+  return *this;
+}
+
 void JsonLine::Write(std::ostream& out) {
   text_.push_back('}');
   text_.push_back('\n');

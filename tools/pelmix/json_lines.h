@@ -7,6 +7,7 @@
 #include <ostream>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace pelmix::cli {
 
@@ -19,6 +20,7 @@ class JsonLine {
   JsonLine& Bytes(std::string_view key, std::string_view value);  // escaped byte string
   JsonLine& Int(std::string_view key, std::int64_t value);
   JsonLine& Bool(std::string_view key, bool value);
+  JsonLine& Strings(std::string_view key, const std::vector<std::string_view>& values);  // array
   // `json` written as it is: a number, an array, null ...
   JsonLine& Raw(std::string_view key, std::string_view json);
   // Writes the object and a line feed.

@@ -1,5 +1,6 @@
 #include "tools/pelmix/module_host.h"
 
+#include <cstdlib>
 #include <filesystem>
 #include <iostream>
 
@@ -29,19 +30,31 @@ uvo::result_t ModuleHost::CreateServiceFactory(
                                  out->ReceiveVoid());
 }
 
-std::string DescribeResult(uvo::result_t code) {
-  return uvo::HexCode(static_cast<std::uint32_t>(code)) + " (" +
-         uvo::ToUtf8(uvo::ResultMessage(code)) + ")";
+std::vector<std::filesystem::path> DefaultKnowledgeBaseCandidates(
+    const std::filesystem::path& binDir) {
+  const std::filesystem::path prefix = binDir / "..";
+  return {(prefix / "share" / "pelmix" / kDefaultKnowledgeBaseName).lexically_normal(),
+          (prefix / kDefaultKnowledgeBaseName).lexically_normal()};
 }
 
 std::string DefaultKnowledgeBase() {
+  const char* named = std::getenv(kKnowledgeBaseVariable);
+  if (named != nullptr && *named != '\0') return named;
   std::error_code error;
   const std::filesystem::path self = std::filesystem::read_symlink("/proc/self/exe", error);
-  if (error) return PELMIX_DEFAULT_KB_NAME;
-  const std::filesystem::path root = self.parent_path().parent_path();
-  const std::filesystem::path installed = root / "share" / "pelmix" / "default.kb";
-  if (std::filesystem::is_regular_file(installed, error)) return installed.string();
-  return (root / PELMIX_DEFAULT_KB_NAME).string();
+  // Without our own location there is no default; the name alone makes a clear open error.
+  if (error) return kDefaultKnowledgeBaseName;
+  const std::vector<std::filesystem::path> candidates =
+      DefaultKnowledgeBaseCandidates(self.parent_path());
+  for (const std::filesystem::path& candidate : candidates) {
+    if (std::filesystem::is_regular_file(candidate, error)) return candidate.string();
+  }
+  return candidates.back().string();
+}
+
+std::string DescribeResult(uvo::result_t code) {
+  return uvo::HexCode(static_cast<std::uint32_t>(code)) + " (" +
+         uvo::ToUtf8(uvo::ResultMessage(code)) + ")";
 }
 
 }  // namespace pelmix::cli

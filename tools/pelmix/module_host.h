@@ -2,8 +2,10 @@
 // tracer echo that --trace asks for.
 #pragma once
 
+#include <filesystem>
 #include <memory>
 #include <string>
+#include <vector>
 
 #include "framework/uvo/anti_phishing.h"
 #include "host/host.h"
@@ -29,8 +31,18 @@ class ModuleHost {
   std::unique_ptr<host::Module> module_;
 };
 
-// The knowledge base the commands use without --kb: the installed default
-// (PREFIX/share/pelmix/default.kb beside PREFIX/bin), else the build tree's, beside bin/.
+// The environment variable that names the knowledge base used without --kb.
+inline constexpr char kKnowledgeBaseVariable[] = "PELMIX_KB";
+inline constexpr char kDefaultKnowledgeBaseName[] = "default.kb";
+
+// Where the default knowledge base may lie for a binary in `binDir`, in the order tried: an
+// installed share/pelmix/ beside the binary's folder, then the build tree's own. Never the
+// current directory: what a command judges must not depend on where it is run.
+std::vector<std::filesystem::path> DefaultKnowledgeBaseCandidates(
+    const std::filesystem::path& binDir);
+
+// The knowledge base the commands use without --kb: $PELMIX_KB when set and not empty, else
+// the first candidate that exists, else the last candidate (so that the error names it).
 std::string DefaultKnowledgeBase();
 
 // "0x80000043 (Not implemented)"

@@ -1,5 +1,4 @@
 // pelmix white: asks the module, through its exports, whether domains are on the white list.
-#include <filesystem>
 #include <iostream>
 
 #include "framework/uvo/anti_phishing.h"
@@ -23,12 +22,13 @@ std::string LastFailureLine(const host::Tracer& tracer) {
 }
 
 int RunWhite(const std::vector<std::string>& args, const GlobalOptions& options) {
-  std::string kbPath = DefaultKnowledgeBase();
+  std::string kbPath;
   std::vector<std::string> domains;
   for (std::size_t i = 0; i < args.size(); ++i) {
     if (args[i] == "--kb") {
       if (i + 1 >= args.size()) return UsageError("--kb needs a file");
       kbPath = args[++i];
+      if (kbPath.empty()) return UsageError("--kb needs a file");
     } else if (args[i].size() > 1 && args[i][0] == '-') {
       return UsageError("white: unknown option " + args[i]);
     } else {
@@ -36,11 +36,17 @@ int RunWhite(const std::vector<std::string>& args, const GlobalOptions& options)
     }
   }
   if (domains.empty()) return UsageError("white needs at least one domain");
+  const bool explicitKb = !kbPath.empty();
+  if (kbPath.empty()) kbPath = DefaultKnowledgeBase();
 
   std::string error;
   uvo::Ptr<host::FileStream> file = host::FileStream::Open(kbPath, &error);
   if (!file) {
     std::cerr << "pelmix white: " << error << "\n";
+    if (!explicitKb) {
+      std::cerr << "pelmix white: no knowledge base given: use --kb FILE or set "
+                << kKnowledgeBaseVariable << "\n";
+    }
     return kExitFailure;
   }
 
@@ -73,10 +79,9 @@ int RunWhite(const std::vector<std::string>& args, const GlobalOptions& options)
 
 }  // namespace
 
-PELMIX_COMMAND(
-    {"white", "[--kb FILE] DOMAIN...",
-     "ask the module whether each DOMAIN is white (default: the installed or built default "
-     "knowledge base)",
-     RunWhite})
+PELMIX_COMMAND({"white", "[--kb FILE] DOMAIN...",
+                "ask the module whether each DOMAIN is white (default knowledge base: $PELMIX_KB, "
+                "else default.kb of the installation or the build tree)",
+                RunWhite})
 
 }  // namespace pelmix::cli

@@ -211,6 +211,14 @@ TEST(HTMLFeatures, TrustedPages) {
   World& w = shared.world();
   HTMLFeatures form("https://forms.popular.com/f/abc?x=1", w, none);
   EXPECT_FALSE(form.trusted());  // content anyone can publish is never trusted
+  // A host listed with "/" publishes under every path; its siblings stay trusted.
+  w.shareLinks.insert({"gist.popular.com", "/"});
+  for (const char* url : {"https://gist.popular.com/", "https://gist.popular.com/user/1a2b",
+                          "https://gist.popular.com/user/?q=1"}) {
+    EXPECT_FALSE(HTMLFeatures(url, w, none).trusted()) << url;
+  }
+  EXPECT_TRUE(HTMLFeatures("https://www.popular.com/user/1a2b", w, none).trusted());
+  EXPECT_TRUE(HTMLFeatures("https://forms.popular.com/g/abc", w, none).trusted());
   w.categorised.insert({"phish.example", "/login"});
   HTMLFeatures phish("http://phish.example/login", w, none);
   EXPECT_TRUE(phish.pageCategorised());

@@ -131,6 +131,39 @@ TEST(HashedCatHostsPathes, ReadFailureIsAnError) {
   EXPECT_EQ(pelmix::testing::ErrorOf([&] { HashedCatHostsPathes db(entry); }), "HDBP: Can't read");
 }
 
+// A database several load buffers long: sections straddle every buffer edge, and an entry
+// that hands out its bytes in small pieces gives the same database as one that reads whole.
+TEST(HashedCatHostsPathes, LargeDatabaseWholeAndInPieces) {
+  std::string bytes;
+  std::size_t hosts = 0;
+  while (bytes.size() < 3 * hpdb::kLoadBufferSize + 17) {
+    const std::string host = std::string("h") + std::to_string(hosts) + ".example";
+    bytes += HostSection(host, static_cast<std::uint16_t>(hosts % 9)) + MaskSection(hosts);
+    if (hosts % 5 == 0) bytes += PathSection(std::string("/p") + std::to_string(hosts) + "/", 100);
+    ++hosts;
+  }
+  for (const std::uint64_t max_read : {0, 1, 7, 1000, 65537}) {
+    auto entry = Entry(bytes);
+    entry->max_read = max_read;
+    const HashedCatHostsPathes db(entry);
+    ASSERT_EQ(db.host_count(), hosts) << max_read;
+    for (const std::size_t i : {std::size_t{0}, hosts / 2, hosts - 1}) {
+      const std::string host = std::string("h") + std::to_string(i) + ".example";
+      const std::string tail = i % 5 == 0 ? "" : " no_paths";
+      EXPECT_EQ(Ask(db, host, "/"), std::to_string(i % 9) + " " + std::to_string(i) + tail);
+      if (i % 5 == 0) {
+        EXPECT_EQ(Ask(db, host, std::string("/p") + std::to_string(i) + "/x"),
+                  std::string("100 ") + std::to_string(i));
+      }
+    }
+  }
+  // A failure after the first buffers is still an error, not a quiet end of the list.
+  auto failing = Entry(bytes);
+  failing->fail_after = static_cast<std::int64_t>(2 * hpdb::kLoadBufferSize + 5);
+  EXPECT_EQ(pelmix::testing::ErrorOf([&] { HashedCatHostsPathes db(failing); }),
+            "HDBP: Can't read");
+}
+
 TEST(HashedCatHostsPathes, ReadsWhatTheWriterWrites) {
   pelmix::kbtools::HpdbWriter writer;
   writer.AddHost("Phish.Example", 3, 0x8000000000000001ull);

@@ -26,15 +26,15 @@ inline std::string SlurpFile(const std::string& path) {
   return bytes.str();
 }
 
-// `args` is a shell fragment placed after the binary's path. Without `withStderr` the
-// standard error is kept apart in `err`.
-inline CliRun RunCli(const std::string& args, bool withStderr = false) {
+// Runs a whole shell command line. Without `withStderr` the standard error is kept apart
+// in `err`.
+inline CliRun RunCommand(const std::string& commandLine, bool withStderr = false) {
   char err_path[] = "/tmp/pelmix-cli-err-XXXXXX";
   const int err_fd = withStderr ? -1 : ::mkstemp(err_path);
   const std::string redirect = withStderr   ? " 2>&1"
                                : err_fd < 0 ? " 2>/dev/null"
                                             : std::string(" 2>") + err_path;
-  const std::string command = std::string(PELMIX_CLI_PATH) + " " + args + redirect;
+  const std::string command = "{ " + commandLine + "; }" + redirect;
   CliRun run{-1, {}, {}};
   if (FILE* pipe = popen(command.c_str(), "r")) {
     char buffer[4096];
@@ -49,6 +49,11 @@ inline CliRun RunCli(const std::string& args, bool withStderr = false) {
     ::unlink(err_path);
   }
   return run;
+}
+
+// `args` is a shell fragment placed after the binary's path.
+inline CliRun RunCli(const std::string& args, bool withStderr = false) {
+  return RunCommand(std::string(PELMIX_CLI_PATH) + " " + args, withStderr);
 }
 
 // A fixture with a fresh directory of its own for the files a CLI test writes.

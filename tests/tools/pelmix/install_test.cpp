@@ -53,7 +53,7 @@ TEST_F(Install, InstalledCliFindsItsModuleAndKnowledgeBase) {
   for (const char* file :
        {"bin/pelmix", "lib/libpelmix.so", "share/pelmix/default.kb",
         "include/pelmix/framework/uvo/anti_phishing.h", "include/pelmix/framework/uvo/interfaces.h",
-        "lib/pkgconfig/pelmix.pc"}) {
+        "lib/pkgconfig/pelmix.pc", "share/pelmix/CREDITS.md"}) {
     EXPECT_TRUE(fs::is_regular_file(prefix / file)) << file;
   }
   // Nothing of the build tree is needed: the moved tree answers the same.
@@ -66,9 +66,11 @@ TEST_F(Install, InstalledCliFindsItsModuleAndKnowledgeBase) {
         << help.out;
     const ShellRun version = Shell(cli + " version");
     EXPECT_EQ(version.status, 0) << version.out;
-    const ShellRun white = Shell(cli + " white paypal.com paypal.fr");
+    // The default knowledge base lists PayPal's country domains; the lookalike stays out.
+    const ShellRun white =
+        Shell("env -u PELMIX_KB " + cli + " white paypal.com paypal.fr paypa1.com");
     EXPECT_EQ(white.status, 0) << white.out;
-    EXPECT_EQ(white.out, "paypal.com\twhite\npaypal.fr\tnot white\n");
+    EXPECT_EQ(white.out, "paypal.com\twhite\npaypal.fr\twhite\npaypa1.com\tnot white\n");
     const ShellRun verify = Shell(cli + " kb verify " + Quoted(where / "share/pelmix/default.kb"));
     EXPECT_EQ(verify.status, 0) << verify.out;
   }
