@@ -2,6 +2,7 @@
 
 #include <stdexcept>
 
+#include "engine/checkers/mail_checker_v3.h"
 #include "engine/checkers/web_checker_v3.h"
 #include "engine/common/trace.h"
 #include "engine/kb/kb_loader.h"
@@ -25,7 +26,7 @@ std::shared_ptr<ap::easy2::WebCheckerI> CheckFactoryV3::CreateWebChecker(const s
 }
 
 std::shared_ptr<ap::easy2::MailCheckerI> CheckFactoryV3::CreateMailChecker(int) {
-  throw std::runtime_error("CheckFactoryV3: mail checking is not available in this build");
+  return std::make_shared<MailCheckerV3>(knowledge_);
 }
 
 bool CheckFactoryV3::IsWhiteDomain(const std::string& domain) {

@@ -19,7 +19,7 @@ class CheckFactoryV3 final : public ap::easy2::CheckFactoryI {
   // A new web checker on the shared knowledge; `confidence` is not used.
   std::shared_ptr<ap::easy2::WebCheckerI> CreateWebChecker(const std::string& url,
                                                            int confidence) override;
-  // The mail checker is not part of this build yet: raises std::runtime_error.
+  // A new mail checker on the shared knowledge; `confidence` is not used.
   std::shared_ptr<ap::easy2::MailCheckerI> CreateMailChecker(int confidence) override;
   std::shared_ptr<ap::easy2::ExtraCheckerI> CreateExtraChecker() override { return nullptr; }
   // Listed, and neither flag restricts the listing.

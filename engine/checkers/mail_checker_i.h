@@ -4,6 +4,7 @@
 #include <cstddef>
 #include <memory>
 #include <string>
+#include <vector>
 
 #include "engine/checkers/base_checker.h"
 #include "engine/common/file_interfaces.h"
@@ -26,6 +27,9 @@ class MailCheckerI : public BaseChecker {
                              std::shared_ptr<ReadableFileI> stream) = 0;  // slot 9
   // Accepted and ignored by this engine's mail checker.
   virtual void AddLogo(int value, std::shared_ptr<logo::ImageDataProviderI> image) = 0;  // slot 10
+  // The vector the last verdict judged (page features, then the link block); false when the
+  // last verdict judged none.
+  virtual bool LastFeatures(std::vector<float>& vector) const = 0;  // slot 11
 };
 
 }  // namespace ap::easy2

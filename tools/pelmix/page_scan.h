@@ -11,6 +11,7 @@
 #include <vector>
 
 #include "framework/uvo/anti_phishing.h"
+#include "tools/pelmix/judging.h"
 
 namespace pelmix::cli {
 
@@ -26,19 +27,7 @@ struct PageScanOptions {
   bool features = false;
 };
 
-struct PageResult {
-  std::string error;  // empty when the page was judged
-  bool phishing = false;
-  bool quiet = true;
-  double weight = 0;
-  std::string target;
-  int confidence = 0;
-  std::int64_t dbstamp = 0;
-  // The vector the model judged, as the module wrote it (%.9g each); none for a trusted page.
-  std::optional<std::vector<std::string>> features;
-};
-
-PageResult ScanPage(cf::services::anti_phishing::IHttpSessionFactory& sessions,
+Judgement ScanPage(cf::services::anti_phishing::IHttpSessionFactory& sessions,
                     const PageInput& input, const PageScanOptions& options);
 
 }  // namespace pelmix::cli

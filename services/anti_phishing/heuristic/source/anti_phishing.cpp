@@ -10,6 +10,7 @@
 #include "internal/helpers/io_adapters/antiphishing_io_adapter.h"
 #include "internal/helpers/tracer/trace_writer.h"
 #include "services/anti_phishing/heuristic/source/http_session.h"
+#include "services/anti_phishing/heuristic/source/mail_session.h"
 
 namespace cf::services::anti_phishing::heuristic {
 namespace {
@@ -192,8 +193,11 @@ uvo::result_t AntiPhishing::CreateSession(const SessionSettings* settings, IMail
     std::shared_ptr<ap::easy2::MailCheckerI> checker = checkFactory_->CreateMailChecker(confidence);
     if (!checker) throw std::runtime_error("Can't create mail checker");
     const std::string prefix = SessionPrefix("mail session");
-    // Mail sessions are not part of this build yet.
-    throw std::runtime_error("Can't create new session");
+    auto session = uvo::Ptr<MailSession>::Adopt(MailSession::Create(
+        services_.locator.Get(), prefix, std::move(checker), *settings, tracerHolder_));
+    if (!session) throw std::runtime_error("Can't create new session");
+    *out = session.Detach();
+    return uvo::kOk;
   } catch (...) {
     return dispatcher_.Dispatch(kCreateSession);
   }
