@@ -5,6 +5,7 @@
 #include <fcntl.h>
 #include <httplib.h>
 #include <signal.h>
+#include <sys/prctl.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -47,6 +48,8 @@ class Daemon {
     argv.push_back(nullptr);
     pid_ = ::fork();
     if (pid_ == 0) {
+      // A test binary that dies must not leave its daemons behind.
+      ::prctl(PR_SET_PDEATHSIG, SIGKILL);
       ::dup2(fd, STDERR_FILENO);
       const int null = ::open("/dev/null", O_RDWR);
       ::dup2(null, STDOUT_FILENO);
