@@ -15,7 +15,7 @@ constexpr int kVerdictLevel = 700;
 }  // namespace
 
 Judgement ScanPage(IHttpSessionFactory& sessions, const PageInput& input,
-                    const PageScanOptions& options) {
+                   const PageScanOptions& options) {
   Judgement result;
   if (!input.error.empty()) {
     result.error = input.error;
@@ -54,17 +54,7 @@ Judgement ScanPage(IHttpSessionFactory& sessions, const PageInput& input,
     return result;
   }
 
-  Verdict verdict{};
-  HeuristicVerdictInfo info{};
-  if ((code = session->GetVerdict(&verdict)) < 0) {
-    result.error = Failure("GetVerdict", code, capture.Take());
-    return result;
-  }
-  if ((code = session->GetHeuristicVerdictInfo(&info)) < 0) {
-    result.error = Failure("GetHeuristicVerdictInfo", code, capture.Take());
-    return result;
-  }
-  Record(verdict, info, result);
+  if (!AskRecords(*session.Get(), capture, result)) return result;
   if (options.features) result.features = FeaturesOf(capture.Take(), kVerdictLevel);
   return result;
 }

@@ -28,6 +28,6 @@ struct PageScanOptions {
 };
 
 Judgement ScanPage(cf::services::anti_phishing::IHttpSessionFactory& sessions,
-                    const PageInput& input, const PageScanOptions& options);
+                   const PageInput& input, const PageScanOptions& options);
 
 }  // namespace pelmix::cli
