@@ -43,7 +43,10 @@ def run_module(a, files, labels):
     prefix = os.path.join(a.corpus, "")
     for line in out.splitlines():
         r = json.loads(line)
-        recs[r["file"][len(prefix):]] = r
+        key = r["file"][len(prefix):]
+        if key.endswith("#1"):
+            key = key[:-2]  # a message starting with "From " is read as an mbox of one
+        recs.setdefault(key, r)
     return recs
 
 
