@@ -12,6 +12,7 @@
 #include "engine/kb/kb_loader.h"
 #include "host/stream.h"
 #include "internal/helpers/io_adapters/antiphishing_io_adapter.h"
+#include "tools/mail/checker_sink.h"
 #include "tools/mail/message_walk.h"
 
 namespace {
@@ -27,35 +28,12 @@ std::shared_ptr<const WebCheckerV3Data> Knowledge() {
   return data;
 }
 
-class CheckerSink final : public pelmix::mail::MessageSink {
- public:
-  explicit CheckerSink(easy3_impl::MailCheckerV3& checker) : checker_(checker) {}
-  void Subject(std::string_view subject, int depth) override {
-    if (depth == 0) checker_.SetSubject(std::string(subject));
-  }
-  void Text(std::string_view data, const pelmix::mail::PartInfo&) override {
-    checker_.AddText(data.data(), data.size());
-  }
-  void Image(std::string_view, const pelmix::mail::PartInfo&) override {}
-  void Attachment(std::string_view name, std::string_view data,
-                  const pelmix::mail::PartInfo& part) override {
-    checker_.AddAttachment(std::string(name), std::string(part.contentType), data.data(),
-                           data.size());
-  }
-  void Url(std::string_view url) override {
-    if (!url.empty()) checker_.AddUrl(std::string(url));
-  }
-
- private:
-  easy3_impl::MailCheckerV3& checker_;
-};
-
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   // A fixed clock: the loud draw is the same for both verdicts.
   easy3_impl::MailCheckerV3 checker(Knowledge(), [] { return std::uint64_t{0}; });
-  CheckerSink sink(checker);
+  pelmix::mail::CheckerSink sink(checker);
   pelmix::mail::WalkMessage(std::string_view(reinterpret_cast<const char*>(data), size), sink);
   ap::easy2::EngineVerdict first, second;
   checker.GetVerdict(first);
