@@ -21,10 +21,10 @@
 #include "engine/checkers/check_factory_v3.h"
 #include "engine/checkers/web_checker_i.h"
 #include "engine/html/decrunch.h"
-#include "host/stream.h"
-#include "internal/helpers/io_adapters/antiphishing_io_adapter.h"
 #include "engine/html/state_machine.h"
 #include "engine/html/tokenizer.h"
+#include "host/stream.h"
+#include "internal/helpers/io_adapters/antiphishing_io_adapter.h"
 
 #ifdef PELMIX_HAVE_GUMBO
 #include <gumbo.h>

@@ -58,6 +58,25 @@ std::optional<std::vector<std::string>> FeaturesOf(const std::vector<host::Trace
 void Record(const cf::services::anti_phishing::Verdict& verdict,
             const cf::services::anti_phishing::HeuristicVerdictInfo& info, Judgement& out);
 
+// Asks a session (web or mail) for its verdict and its details and fills `out`; on a failing
+// call, `out.error` names it with the module's failure line from `capture`.
+template <class Session>
+bool AskRecords(Session& session, host::Tracer::ThreadCapture& capture, Judgement& out) {
+  cf::services::anti_phishing::Verdict verdict{};
+  cf::services::anti_phishing::HeuristicVerdictInfo info{};
+  uvo::result_t code = session.GetVerdict(&verdict);
+  if (code < 0) {
+    out.error = Failure("GetVerdict", code, capture.Take());
+    return false;
+  }
+  if ((code = session.GetHeuristicVerdictInfo(&info)) < 0) {
+    out.error = Failure("GetHeuristicVerdictInfo", code, capture.Take());
+    return false;
+  }
+  Record(verdict, info, out);
+  return true;
+}
+
 // One line: "NAME: clean", "NAME: PHISHING weight=W target=T" or "NAME: error REASON"; with
 // `json` one object with "file" (and "url" when given), the records' fields and, with
 // `features`, the vector.
@@ -75,6 +94,7 @@ int LoadService(const std::string& command, const std::string& kb, const GlobalO
 
 // Runs work(i) for i in [0, count) on `jobs` threads and prints each result to stdout in
 // order of i as soon as it and all before it are done; a progress bar on a terminal.
-void RunInOrder(std::size_t count, unsigned jobs, const std::function<std::string(std::size_t)>& work);
+void RunInOrder(std::size_t count, unsigned jobs,
+                const std::function<std::string(std::size_t)>& work);
 
 }  // namespace pelmix::cli

@@ -131,7 +131,8 @@ int RunMail(const std::vector<std::string>& args, const GlobalOptions& options) 
 
 }  // namespace
 
-PELMIX_COMMAND({"mail", "[--kb FILE] [--level 1|2|3] [--json] [--features] [--jobs N] FILE|-|DIR...",
+PELMIX_COMMAND({"mail",
+                "[--kb FILE] [--level 1|2|3] [--json] [--features] [--jobs N] FILE|-|DIR...",
                 "judge mail messages (RFC 822 files or mbox) through the module's mail sessions "
                 "(exit 3: phishing found)",
                 RunMail})

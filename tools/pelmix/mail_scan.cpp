@@ -81,17 +81,7 @@ Judgement ScanMessage(IMailSessionFactory& sessions, const mail::MessageBuffer& 
     result.error = Failure(sink.failedCall, sink.failure, capture.Take());
     return result;
   }
-  Verdict verdict{};
-  HeuristicVerdictInfo info{};
-  if ((code = session->GetVerdict(&verdict)) < 0) {
-    result.error = Failure("GetVerdict", code, capture.Take());
-    return result;
-  }
-  if ((code = session->GetHeuristicVerdictInfo(&info)) < 0) {
-    result.error = Failure("GetHeuristicVerdictInfo", code, capture.Take());
-    return result;
-  }
-  Record(verdict, info, result);
+  if (!AskRecords(*session.Get(), capture, result)) return result;
   if (options.features) result.features = FeaturesOf(capture.Take(), kFeaturesLevel);
   return result;
 }

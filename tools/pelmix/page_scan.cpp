@@ -44,18 +44,7 @@ Judgement PageJudgement::Finish() {
     result.error = error_;
     return result;
   }
-  Verdict verdict{};
-  HeuristicVerdictInfo info{};
-  uvo::result_t code;
-  if ((code = session_->GetVerdict(&verdict)) < 0) {
-    result.error = Failure("GetVerdict", code, capture_.Take());
-    return result;
-  }
-  if ((code = session_->GetHeuristicVerdictInfo(&info)) < 0) {
-    result.error = Failure("GetHeuristicVerdictInfo", code, capture_.Take());
-    return result;
-  }
-  Record(verdict, info, result);
+  if (!AskRecords(*session_.Get(), capture_, result)) return result;
   if (features_) result.features = FeaturesOf(capture_.Take(), kVerdictLevel);
   return result;
 }

@@ -63,7 +63,8 @@ TEST_F(MailCommand, AnExecutableAttachmentReachesTheEngine) {
   ASSERT_NE(open, std::string::npos);
   // The first value of the link block: the dangerous-attachment feature.
   std::size_t at = open + 12;
-  for (std::size_t i = 0; i < html_features::kMailPageVectorSize; ++i) at = run.out.find(',', at) + 1;
+  for (std::size_t i = 0; i < html_features::kMailPageVectorSize; ++i)
+    at = run.out.find(',', at) + 1;
   EXPECT_EQ(run.out.substr(at, 2), "1,") << run.out.substr(at, 20);
 }
 

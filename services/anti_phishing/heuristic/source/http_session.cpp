@@ -78,39 +78,14 @@ uvo::result_t HttpSession::AppendHtml(ByteRange html) {
   }
 }
 
-void HttpSession::TraceVerdictLine(const char* operation, const std::string& recordText) {
-  helpers::TraceWriter line(services_.tracer.Get(), kVerdictTraceLevel);
-  if (!line.Accepted()) return;
-  line.Append(prefix_)
-      .Append(operation)
-      .Append(": protection level: ")
-      .Append(std::to_string(protectionLevel_))
-      .Append(" ")
-      .Append(recordText);
-  line.Commit();
-}
-
-void HttpSession::TraceFeatures() {
-  std::vector<float> vector;
-  if (!checker_->LastFeatures(vector)) return;
-  helpers::TraceWriter line(services_.tracer.Get(), kVerdictTraceLevel);
-  if (!line.Accepted()) return;
-  line.Append(prefix_).Append(kGetHeuristicVerdictInfo).Append(": features:");
-  char number[32];
-  for (const float value : vector) {
-    const int n = std::snprintf(number, sizeof number, " %.9g", static_cast<double>(value));
-    line.Append(std::string_view(number, static_cast<std::size_t>(n)));
-  }
-  line.Commit();
-}
-
 uvo::result_t HttpSession::GetVerdict(Verdict* out) {
   if (out == nullptr) return uvo::kErrInvalidArgument;
   try {
     ap::easy2::EngineVerdict engine;
     checker_->GetVerdict(engine);
     FillVerdict(engine, *out);
-    if (!engine.quiet) TraceVerdictLine(kGetVerdict, TextOf(*out));
+    if (!engine.quiet)
+      TraceRecordLine(services_.tracer.Get(), prefix_, kGetVerdict, protectionLevel_, TextOf(*out));
     return uvo::kOk;
   } catch (...) {
     return dispatcher_.Dispatch(kGetVerdict);
@@ -123,8 +98,13 @@ uvo::result_t HttpSession::GetHeuristicVerdictInfo(HeuristicVerdictInfo* out) {
     ap::easy2::EngineVerdict engine;
     checker_->GetVerdict(engine);
     FillHeuristicVerdictInfo(engine, protectionLevel_, services_.allocator.Get(), *out);
-    TraceVerdictLine(kGetHeuristicVerdictInfo, TextOf(*out));
-    if (traceFeatures_) TraceFeatures();
+    TraceRecordLine(services_.tracer.Get(), prefix_, kGetHeuristicVerdictInfo, protectionLevel_,
+                    TextOf(*out));
+    if (traceFeatures_) {
+      TraceFeatureLine(services_.tracer.Get(), kVerdictTraceLevel, prefix_,
+                       kGetHeuristicVerdictInfo,
+                       [this](std::vector<float>& v) { return checker_->LastFeatures(v); });
+    }
     return uvo::kOk;
   } catch (...) {
     return dispatcher_.Dispatch(kGetHeuristicVerdictInfo);

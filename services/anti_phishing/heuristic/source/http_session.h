@@ -38,8 +38,6 @@ class HttpSession final : public uvo::ObjectImpl<HttpSession, IHttpSession> {
  private:
   void Initialize(const std::string& prefix, std::shared_ptr<ap::easy2::WebCheckerI> checker,
                   std::int32_t protectionLevel, std::shared_ptr<TracerHolder> tracerHolder);
-  void TraceVerdictLine(const char* operation, const std::string& recordText);
-  void TraceFeatures();
 
   uvo::detail::ObjectModuleAutoLock moduleLock_;
   helpers::LocatorServices services_;

@@ -23,7 +23,6 @@ constexpr char kSetMessageSubject[] =
 constexpr char kGetVerdict[] = "cf::services::anti_phishing::heuristic::MailSession::GetVerdict";
 constexpr char kGetHeuristicVerdictInfo[] =
     "cf::services::anti_phishing::heuristic::MailSession::GetHeuristicVerdictInfo";
-constexpr int kVerdictTraceLevel = 700;
 
 // The operation's own name, after the namespace and class: the mail session's trace lines
 // name it so.
@@ -107,39 +106,15 @@ uvo::result_t MailSession::SetMessageSubject(const char* subject) {
   }
 }
 
-void MailSession::TraceVerdictLine(const char* operation, const std::string& recordText) {
-  helpers::TraceWriter line(services_.tracer.Get(), kVerdictTraceLevel);
-  if (!line.Accepted()) return;
-  line.Append(prefix_)
-      .Append(ShortName(operation))
-      .Append(": protection level: ")
-      .Append(std::to_string(protectionLevel_))
-      .Append(" ")
-      .Append(recordText);
-  line.Commit();
-}
-
-void MailSession::TraceFeatures() {
-  helpers::TraceWriter line(services_.tracer.Get(), kMailFeaturesTraceLevel);
-  if (!line.Accepted()) return;
-  std::vector<float> vector;
-  if (!checker_->LastFeatures(vector)) return;
-  line.Append(prefix_).Append(ShortName(kGetHeuristicVerdictInfo)).Append(": features:");
-  char number[32];
-  for (const float value : vector) {
-    const int n = std::snprintf(number, sizeof number, " %.9g", static_cast<double>(value));
-    line.Append(std::string_view(number, static_cast<std::size_t>(n)));
-  }
-  line.Commit();
-}
-
 uvo::result_t MailSession::GetVerdict(Verdict* out) {
   if (out == nullptr) return uvo::kErrInvalidArgument;
   try {
     ap::easy2::EngineVerdict engine;
     checker_->GetVerdict(engine);
     FillVerdict(engine, *out);
-    if (!engine.quiet) TraceVerdictLine(kGetVerdict, TextOf(*out));
+    if (!engine.quiet)
+      TraceRecordLine(services_.tracer.Get(), prefix_, ShortName(kGetVerdict), protectionLevel_,
+                      TextOf(*out));
     return uvo::kOk;
   } catch (...) {
     return dispatcher_.Dispatch(kGetVerdict);
@@ -152,8 +127,11 @@ uvo::result_t MailSession::GetHeuristicVerdictInfo(HeuristicVerdictInfo* out) {
     ap::easy2::EngineVerdict engine;
     checker_->GetVerdict(engine);
     FillHeuristicVerdictInfo(engine, protectionLevel_, services_.allocator.Get(), *out);
-    TraceVerdictLine(kGetHeuristicVerdictInfo, TextOf(*out));
-    TraceFeatures();
+    TraceRecordLine(services_.tracer.Get(), prefix_, ShortName(kGetHeuristicVerdictInfo),
+                    protectionLevel_, TextOf(*out));
+    TraceFeatureLine(services_.tracer.Get(), kMailFeaturesTraceLevel, prefix_,
+                     ShortName(kGetHeuristicVerdictInfo),
+                     [this](std::vector<float>& v) { return checker_->LastFeatures(v); });
     return uvo::kOk;
   } catch (...) {
     return dispatcher_.Dispatch(kGetHeuristicVerdictInfo);

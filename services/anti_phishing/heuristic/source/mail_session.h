@@ -44,9 +44,6 @@ class MailSession final : public uvo::ObjectImpl<MailSession, IMailSession> {
   uvo::result_t GetHeuristicVerdictInfo(HeuristicVerdictInfo* out) override;
 
  private:
-  void TraceVerdictLine(const char* operation, const std::string& recordText);
-  void TraceFeatures();
-
   uvo::detail::ObjectModuleAutoLock moduleLock_;
   helpers::LocatorServices services_;
   std::shared_ptr<TracerHolder> tracerHolder_;

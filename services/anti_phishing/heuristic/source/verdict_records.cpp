@@ -1,10 +1,16 @@
 #include "services/anti_phishing/heuristic/source/verdict_records.h"
 
 #include <charconv>
+#include <cstdio>
 
+#include "internal/helpers/tracer/trace_writer.h"
 #include "services/anti_phishing/heuristic/source/anti_phishing.h"
 
 namespace cf::services::anti_phishing::heuristic {
+
+namespace {
+constexpr int kRecordTraceLevel = 700;
+}  // namespace
 
 void FillVerdict(const ap::easy2::EngineVerdict& engine, Verdict& out) {
   out.phishingDetected = engine.phishing;
@@ -47,6 +53,35 @@ std::string TextOf(const HeuristicVerdictInfo& info) {
   text += std::to_string(info.dbstamp);
   text += " }";
   return text;
+}
+
+void TraceRecordLine(uvo::ITracer* tracer, std::string_view prefix, std::string_view operation,
+                     std::int32_t protectionLevel, const std::string& recordText) {
+  helpers::TraceWriter line(tracer, kRecordTraceLevel);
+  if (!line.Accepted()) return;
+  line.Append(prefix)
+      .Append(operation)
+      .Append(": protection level: ")
+      .Append(std::to_string(protectionLevel))
+      .Append(" ")
+      .Append(recordText);
+  line.Commit();
+}
+
+void TraceFeatureLine(uvo::ITracer* tracer, int traceLevel, std::string_view prefix,
+                      std::string_view operation,
+                      const std::function<bool(std::vector<float>&)>& vectorOf) {
+  std::vector<float> vector;
+  if (!vectorOf(vector)) return;
+  helpers::TraceWriter line(tracer, traceLevel);
+  if (!line.Accepted()) return;
+  line.Append(prefix).Append(operation).Append(": features:");
+  char number[32];
+  for (const float value : vector) {
+    const int n = std::snprintf(number, sizeof number, " %.9g", static_cast<double>(value));
+    line.Append(std::string_view(number, static_cast<std::size_t>(n)));
+  }
+  line.Commit();
 }
 
 }  // namespace cf::services::anti_phishing::heuristic

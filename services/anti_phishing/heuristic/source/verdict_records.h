@@ -3,7 +3,10 @@
 #pragma once
 
 #include <cstdint>
+#include <functional>
 #include <string>
+#include <string_view>
+#include <vector>
 
 #include "engine/checkers/engine_verdict.h"
 #include "framework/uvo/anti_phishing.h"
@@ -22,5 +25,15 @@ std::string TextOf(const Verdict& verdict);
 // Empty for a quiet record; otherwise
 // "Heuristic {, confidence = 1, weight = 0.500000, target = T, dbstamp = 4294967295 }".
 std::string TextOf(const HeuristicVerdictInfo& info);
+
+// The sessions' record line at level 700: PREFIX OPERATION ": protection level: " LEVEL " "
+// TEXT.
+void TraceRecordLine(uvo::ITracer* tracer, std::string_view prefix, std::string_view operation,
+                     std::int32_t protectionLevel, const std::string& recordText);
+// The vector a verdict judged, at `traceLevel`: PREFIX OPERATION ": features:" and " %.9g" per
+// value. `vectorOf` answers false when there is no vector: then nothing is traced.
+void TraceFeatureLine(uvo::ITracer* tracer, int traceLevel, std::string_view prefix,
+                      std::string_view operation,
+                      const std::function<bool(std::vector<float>&)>& vectorOf);
 
 }  // namespace cf::services::anti_phishing::heuristic

@@ -65,7 +65,8 @@ std::string Pdf(const std::string& content) {
             reinterpret_cast<const Bytef*>(content.data()), content.size(), 9);
   packed.resize(size);
   return "%PDF-1.4\n4 0 obj\n<< /Length " + std::to_string(size) +
-         " /Filter /FlateDecode >>\nstream\n" + packed + "\nendstream\nendobj\ntrailer\n<< >>\n"
+         " /Filter /FlateDecode >>\nstream\n" + packed +
+         "\nendstream\nendobj\ntrailer\n<< >>\n"
          "%%EOF\n";
 }
 
@@ -202,14 +203,16 @@ TEST_F(MailSessionAbi, PartsAreSniffedAndClassified) {
   ASSERT_EQ(att->AddAttachment("a.htm", "text/html; charset=utf-8", Stream(html).Get()), 0);
   EXPECT_TRUE(anchorsIn(att.Get()));
   auto exact = Open();  // exactly "text/html": HTML without sniffing
-  ASSERT_EQ(exact->AddAttachment("a.htm", "text/html", Stream("x<a href=\"http://y.example/\">"
-                                                              "q</a>").Get()),
+  ASSERT_EQ(exact->AddAttachment("a.htm", "text/html",
+                                 Stream("x<a href=\"http://y.example/\">"
+                                        "q</a>")
+                                     .Get()),
             0);
   EXPECT_TRUE(anchorsIn(exact.Get()));
   // A PDF by its name and by its type: its text reaches the extractor.
   const std::string pdf = Pdf("BT\n/F1 12 Tf\n(Your PayPal account) Tj\nET\n");
-  for (const auto& [name, type] : {std::pair{"report.pdf", "application/octet-stream"},
-                                   std::pair{"x", "application/pdf"}}) {
+  for (const auto& [name, type] :
+       {std::pair{"report.pdf", "application/octet-stream"}, std::pair{"x", "application/pdf"}}) {
     auto s = Open();
     ASSERT_EQ(s->AddAttachment(name, type, Stream(pdf).Get()), 0);
     HeuristicVerdictInfo info{};
