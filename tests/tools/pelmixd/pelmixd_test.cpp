@@ -477,6 +477,11 @@ TEST_F(Pelmixd, ConfigFileSetsTheLimits) {
 // 2,000 requests from 8 keep-alive clients: every one answered, and the daemon's memory after
 // the run close to what it was after a warm-up.
 TEST_F(Pelmixd, LoadFromEightClientsIsAllAnsweredInBoundedMemory) {
+#ifdef PELMIX_SANITIZED
+  // The sanitizers' quarantine and shadow memory, and their slowdown against the daemon's
+  // timeouts, are not what this bound is about; the plain build runs it.
+  GTEST_SKIP() << "memory and timing bounds are measured without sanitizers";
+#endif
   Start({"--threads", "8"});
   constexpr int kClients = 8, kPerClient = 250;
   const auto run = [&](int perClient, std::atomic<int>& good) {
