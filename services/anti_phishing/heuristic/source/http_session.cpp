@@ -81,11 +81,8 @@ uvo::result_t HttpSession::AppendHtml(ByteRange html) {
 uvo::result_t HttpSession::GetVerdict(Verdict* out) {
   if (out == nullptr) return uvo::kErrInvalidArgument;
   try {
-    ap::easy2::EngineVerdict engine;
-    checker_->GetVerdict(engine);
-    FillVerdict(engine, *out);
-    if (!engine.quiet)
-      TraceRecordLine(services_.tracer.Get(), prefix_, kGetVerdict, protectionLevel_, TextOf(*out));
+    AnswerVerdict(*checker_, {services_.tracer.Get(), prefix_, kGetVerdict, protectionLevel_},
+                  *out);
     return uvo::kOk;
   } catch (...) {
     return dispatcher_.Dispatch(kGetVerdict);
@@ -95,16 +92,10 @@ uvo::result_t HttpSession::GetVerdict(Verdict* out) {
 uvo::result_t HttpSession::GetHeuristicVerdictInfo(HeuristicVerdictInfo* out) {
   if (out == nullptr) return uvo::kErrInvalidArgument;
   try {
-    ap::easy2::EngineVerdict engine;
-    checker_->GetVerdict(engine);
-    FillHeuristicVerdictInfo(engine, protectionLevel_, services_.allocator.Get(), *out);
-    TraceRecordLine(services_.tracer.Get(), prefix_, kGetHeuristicVerdictInfo, protectionLevel_,
-                    TextOf(*out));
-    if (traceFeatures_) {
-      TraceFeatureLine(services_.tracer.Get(), kVerdictTraceLevel, prefix_,
-                       kGetHeuristicVerdictInfo,
-                       [this](std::vector<float>& v) { return checker_->LastFeatures(v); });
-    }
+    AnswerHeuristicVerdictInfo(
+        *checker_, {services_.tracer.Get(), prefix_, kGetHeuristicVerdictInfo, protectionLevel_},
+        services_.allocator.Get(),
+        traceFeatures_ ? std::optional<int>(kVerdictTraceLevel) : std::nullopt, *out);
     return uvo::kOk;
   } catch (...) {
     return dispatcher_.Dispatch(kGetHeuristicVerdictInfo);

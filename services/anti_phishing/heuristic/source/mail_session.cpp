@@ -109,12 +109,9 @@ uvo::result_t MailSession::SetMessageSubject(const char* subject) {
 uvo::result_t MailSession::GetVerdict(Verdict* out) {
   if (out == nullptr) return uvo::kErrInvalidArgument;
   try {
-    ap::easy2::EngineVerdict engine;
-    checker_->GetVerdict(engine);
-    FillVerdict(engine, *out);
-    if (!engine.quiet)
-      TraceRecordLine(services_.tracer.Get(), prefix_, ShortName(kGetVerdict), protectionLevel_,
-                      TextOf(*out));
+    AnswerVerdict(*checker_,
+                  {services_.tracer.Get(), prefix_, ShortName(kGetVerdict), protectionLevel_},
+                  *out);
     return uvo::kOk;
   } catch (...) {
     return dispatcher_.Dispatch(kGetVerdict);
@@ -124,14 +121,10 @@ uvo::result_t MailSession::GetVerdict(Verdict* out) {
 uvo::result_t MailSession::GetHeuristicVerdictInfo(HeuristicVerdictInfo* out) {
   if (out == nullptr) return uvo::kErrInvalidArgument;
   try {
-    ap::easy2::EngineVerdict engine;
-    checker_->GetVerdict(engine);
-    FillHeuristicVerdictInfo(engine, protectionLevel_, services_.allocator.Get(), *out);
-    TraceRecordLine(services_.tracer.Get(), prefix_, ShortName(kGetHeuristicVerdictInfo),
-                    protectionLevel_, TextOf(*out));
-    TraceFeatureLine(services_.tracer.Get(), kMailFeaturesTraceLevel, prefix_,
-                     ShortName(kGetHeuristicVerdictInfo),
-                     [this](std::vector<float>& v) { return checker_->LastFeatures(v); });
+    AnswerHeuristicVerdictInfo(
+        *checker_,
+        {services_.tracer.Get(), prefix_, ShortName(kGetHeuristicVerdictInfo), protectionLevel_},
+        services_.allocator.Get(), kMailFeaturesTraceLevel, *out);
     return uvo::kOk;
   } catch (...) {
     return dispatcher_.Dispatch(kGetHeuristicVerdictInfo);

@@ -4,6 +4,7 @@
 
 #include <cstdint>
 #include <functional>
+#include <optional>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -35,5 +36,41 @@ void TraceRecordLine(uvo::ITracer* tracer, std::string_view prefix, std::string_
 void TraceFeatureLine(uvo::ITracer* tracer, int traceLevel, std::string_view prefix,
                       std::string_view operation,
                       const std::function<bool(std::vector<float>&)>& vectorOf);
+
+// The bodies of a session's GetVerdict and GetHeuristicVerdictInfo, for any checker with
+// GetVerdict(EngineVerdict&) and LastFeatures(std::vector<float>&). Errors propagate to the
+// session's dispatcher.
+struct VerdictTrace {
+  uvo::ITracer* tracer;
+  std::string_view prefix;
+  std::string_view operation;
+  std::int32_t protectionLevel;
+};
+
+// A quiet verdict is not traced.
+template <class Checker>
+void AnswerVerdict(Checker& checker, const VerdictTrace& trace, Verdict& out) {
+  ap::easy2::EngineVerdict engine;
+  checker.GetVerdict(engine);
+  FillVerdict(engine, out);
+  if (!engine.quiet)
+    TraceRecordLine(trace.tracer, trace.prefix, trace.operation, trace.protectionLevel,
+                    TextOf(out));
+}
+
+// The record line always; the judged vector too at `featureTraceLevel` when one is given.
+template <class Checker>
+void AnswerHeuristicVerdictInfo(Checker& checker, const VerdictTrace& trace,
+                                uvo::IAllocator* allocator, std::optional<int> featureTraceLevel,
+                                HeuristicVerdictInfo& out) {
+  ap::easy2::EngineVerdict engine;
+  checker.GetVerdict(engine);
+  FillHeuristicVerdictInfo(engine, trace.protectionLevel, allocator, out);
+  TraceRecordLine(trace.tracer, trace.prefix, trace.operation, trace.protectionLevel, TextOf(out));
+  if (featureTraceLevel) {
+    TraceFeatureLine(trace.tracer, *featureTraceLevel, trace.prefix, trace.operation,
+                     [&checker](std::vector<float>& v) { return checker.LastFeatures(v); });
+  }
+}
 
 }  // namespace cf::services::anti_phishing::heuristic
