@@ -41,9 +41,6 @@ int Run(int argc, char** argv) {
     std::cout << Usage();
     return 0;
   }
-  if (options.kb.empty()) options.kb = cli::DefaultKnowledgeBase();
-  if (options.module.empty()) options.module = cli::DefaultModulePath();
-
   // Signals are taken by one thread with sigwait; every other thread, the HTTP workers
   // included, inherits this mask. A peer that hangs up must not kill the process.
   sigset_t handled;
@@ -52,22 +49,16 @@ int Run(int argc, char** argv) {
   pthread_sigmask(SIG_BLOCK, &handled, nullptr);
   ::signal(SIGPIPE, SIG_IGN);
 
-  std::unique_ptr<cli::ModuleHost> host;
-  try {
-    host = std::make_unique<cli::ModuleHost>(cli::GlobalOptions{options.module, std::nullopt});
-  } catch (const std::exception& e) {
-    Log(e.what());
+  ServingHost serving;
+  if (const std::string startError = StartServing(options.module, options.kb, serving);
+      !startError.empty()) {
+    Log(startError);
     return kExitStartup;
   }
-  ServiceHolder services(*host, options.kb);
-  if (const std::string loadError = services.Load(); !loadError.empty()) {
-    Log(loadError);
-    return kExitStartup;
-  }
+  cli::ModuleHost* host = serving.host.get();
+  ServiceHolder& services = *serving.services;
   Metrics metrics;
   Published(services, metrics);
-  Log("knowledge base " + options.kb + " loaded, stamp " +
-      std::to_string(services.Current()->dbstamp));
 
   Server server(options, services, metrics);
   std::string bindError;

@@ -2,6 +2,7 @@
 
 #include "host/stream.h"
 #include "host/tracer.h"
+#include "tools/pelmixd/log.h"
 
 namespace pelmix::pelmixd {
 namespace {
@@ -75,6 +76,21 @@ std::string ServiceHolder::Load() {
 std::shared_ptr<const LoadedService> ServiceHolder::Current() const {
   std::lock_guard<std::mutex> lock(mutex_);
   return current_;
+}
+
+std::string StartServing(std::string& module, std::string& kb, ServingHost& out) {
+  if (kb.empty()) kb = cli::DefaultKnowledgeBase();
+  if (module.empty()) module = cli::DefaultModulePath();
+  try {
+    out.host = std::make_unique<cli::ModuleHost>(cli::GlobalOptions{module, std::nullopt});
+  } catch (const std::exception& e) {
+    return e.what();
+  }
+  out.services = std::make_unique<ServiceHolder>(*out.host, kb);
+  if (std::string error = out.services->Load(); !error.empty()) return error;
+  Log("knowledge base " + kb + " loaded, stamp " +
+      std::to_string(out.services->Current()->dbstamp));
+  return {};
 }
 
 }  // namespace pelmix::pelmixd

@@ -43,4 +43,13 @@ class ServiceHolder {
   std::shared_ptr<const LoadedService> current_;
 };
 
+// The module and a service on the knowledge base, started as every long-running host starts
+// them: an empty `module` or `kb` is first set to the one next to the binary. Logs what it
+// loaded; returns an empty string, or why it could not start.
+struct ServingHost {
+  std::unique_ptr<cli::ModuleHost> host;
+  std::unique_ptr<ServiceHolder> services;
+};
+std::string StartServing(std::string& module, std::string& kb, ServingHost& out);
+
 }  // namespace pelmix::pelmixd
