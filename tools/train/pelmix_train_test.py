@@ -147,7 +147,7 @@ class TrainTest(unittest.TestCase):
         oof = np.full(len(y), np.inf, dtype=np.float32)
         trusted = np.zeros(len(y), dtype=bool)
         for k in range(tr.CV_FOLDS):
-            model = tr.fit(X, labels, dev & (fold != k), 7)
+            model = tr.fit(X, labels, dev & (fold != k), 7, pt.CHANNEL_QUANTILES["mail"])
             held = dev & (fold == k)
             oof[held] = tr.radii(X[held], model, trusted[held])
         lab = np.array(labels)

@@ -62,9 +62,9 @@ def write_exact(path, text):
         f.write(text)
 
 
-def fit(X, labels, rows, seed):
+def fit(X, labels, rows, seed, quantiles=pt.LEVEL_QUANTILES):
     """Rules levels and network fitted on the given rows."""
-    rules = pt.fit_rules(X[rows])
+    rules = pt.fit_rules(X[rows], quantiles)
     E = pt.encode_rules(X[rows], rules)
     y = np.array([lab == POSITIVE for lab in labels])[rows]
     W, b = pt.fit_network(E, y, seed=seed,
@@ -96,12 +96,13 @@ def train(channel, X, labels, groups, trusted, part, seed, fit_X=None):
     what the engine sees, on which the thresholds are chosen.
     """
     fit_X = X if fit_X is None else fit_X
+    quantiles = pt.CHANNEL_QUANTILES[channel]
     labels_arr = np.array(labels, dtype=object)
     dev = ((part == "train") | (part == "calib")) & ~trusted
     fold = fold_of(groups, CV_FOLDS, seed)
     oof = np.full(len(labels), np.inf, dtype=np.float32)
     for k in range(CV_FOLDS):
-        model = fit(fit_X, labels, dev & (fold != k), seed)
+        model = fit(fit_X, labels, dev & (fold != k), seed, quantiles)
         held = dev & (fold == k)
         oof[held] = radii(X[held], model, trusted[held])
     thr, loud = None, None
@@ -117,7 +118,7 @@ def train(channel, X, labels, groups, trusted, part, seed, fit_X=None):
         raise ValueError("no negative samples to choose a threshold on")
     pos = dev & (labels_arr == POSITIVE)
     cv_recall = float(np.mean(oof[pos] <= thr)) if pos.any() else float("nan")
-    rules, W, b = fit(fit_X, labels, dev, seed)
+    rules, W, b = fit(fit_X, labels, dev, seed, quantiles)
     return rules, W, b, thr, min(loud, thr), cv_recall
 
 
