@@ -46,6 +46,11 @@ class MailCheckerV3 final : public ap::easy2::MailCheckerI {
                      std::shared_ptr<ap::ReadableFileI> stream) override;
   void AddLogo(int value, std::shared_ptr<ap::logo::ImageDataProviderI> image) override;
   bool LastFeatures(std::vector<float>& vector) const override;
+  // Tells `observer` every lexeme and phrase the message's text matches (see
+  // HTMLFeatures::setLexemeObserver); for tools, not for the sessions.
+  void SetLexemeObserver(html_features::LexemeObserverI* observer) {
+    features_.setLexemeObserver(observer);
+  }
 
   // The link callback of the feature extractor.
   class MailFeatures final : public ap::HTMLFeatures::TagAFeaturesI {

@@ -105,12 +105,14 @@ void HTMLFeatures::Impl::organisationText(const lex::LexemeStats& s) {
 void HTMLFeatures::Impl::PageText::word() { f.nestedWord(); }
 
 void HTMLFeatures::Impl::PageText::lexeme(const lex::LexemeStats& s) {
+  if (f.observer_ != nullptr) f.observer_->lexeme(s);
   f.events_.addWeighted(kEvLexeme, Weight(s.first_value));
   f.organisationText(s);
   f.sensitive(s);
 }
 
 void HTMLFeatures::Impl::PageText::phrase(const LexemeDB::Phrase& p, std::uint16_t items) {
+  if (f.observer_ != nullptr) f.observer_->phrase(p);
   f.events_.addWeighted(kEvPhrase, Weight(p.stats.first_value));
   f.events_.add(kEvPhraseItems, items);
   f.organisationText(p.stats);
@@ -120,12 +122,14 @@ void HTMLFeatures::Impl::PageText::phrase(const LexemeDB::Phrase& p, std::uint16
 void HTMLFeatures::Impl::ScriptText::word() { f.nestedWord(); }
 
 void HTMLFeatures::Impl::ScriptText::lexeme(const lex::LexemeStats& s) {
+  if (f.observer_ != nullptr) f.observer_->lexeme(s);
   f.events_.addWeighted(kEvScriptLexeme, Weight(s.first_value));
   // Each hit adds one to the organisation's script-text counter.
   f.mark(s.second_value, 2, 1.0f);
 }
 
 void HTMLFeatures::Impl::ScriptText::phrase(const LexemeDB::Phrase& p, std::uint16_t items) {
+  if (f.observer_ != nullptr) f.observer_->phrase(p);
   if (p.stats.first_value != 0) f.events_.add(kEvScriptPhrase, Weight(p.stats.first_value));
   f.events_.add(kEvScriptPhraseItems, items);
   f.mark(p.stats.second_value, 2, 1.0f);
@@ -229,6 +233,7 @@ void HTMLFeatures::Impl::anchorEnd(const std::string& text) {
   inAnchor_ = false;
   // The anchor's own lexemes: their weights and the organisations they name.
   LexemeSummary summary;
+  summary.observer = observer_;
   {
     lex::WordsFinder<LexemeDB, LexemeSummary> finder(lexemes_, summary);
     lex::UTF8Normalizer<lex::WordsFinder<LexemeDB, LexemeSummary>> normalizer(finder);
@@ -308,6 +313,12 @@ HTMLFeatures::HTMLFeatures(const std::string& pageUrl, WhiteDomainI& lookup,
     : impl_(std::make_unique<Impl>(*this, pageUrl, lookup, lexemes, linkConsumer)) {}
 
 HTMLFeatures::~HTMLFeatures() = default;
+
+void HTMLFeatures::setLexemeObserver(html_features::LexemeObserverI* observer) {
+  impl_->observer_ = observer;
+  impl_->title_.setObserver(observer);
+  impl_->description_.setObserver(observer);
+}
 
 bool HTMLFeatures::trusted() const { return impl_->page_.trusted; }
 bool HTMLFeatures::pageCategorised() const { return impl_->pageCategorised_; }

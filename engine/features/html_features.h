@@ -22,6 +22,10 @@
 #include "engine/kb/white_domain_i.h"
 #include "engine/kb/words_db.h"
 
+namespace html_features {
+class LexemeObserverI;
+}  // namespace html_features
+
 namespace ap {
 
 class HTMLFeatures : public html::DecrunchInterfaces::Handler {
@@ -62,6 +66,11 @@ class HTMLFeatures : public html::DecrunchInterfaces::Handler {
   bool analyseLink(const std::string& url);
   // Whether `url`'s host and path are in the categorised host database.
   bool categorised(const std::string& url);
+
+  // Every lexeme and phrase the extractor's word finders match from now on (page, script,
+  // title, description and anchor text) is told to `observer` too; null stops it. The
+  // observer must outlive the extractor or be replaced before it goes.
+  void setLexemeObserver(html_features::LexemeObserverI* observer);
 
   // html::Decrunch::Handler
   void text(const char* data, std::size_t length) override;

@@ -107,6 +107,7 @@ class HTMLFeatures::Impl {
   html_features::TitleLexer title_;
   html_features::TitleLexer description_;
   html_features::TextToString anchorText_;
+  html_features::LexemeObserverI* observer_ = nullptr;
   bool inAnchor_ = false;
   std::array<float, html_features::kUrlRecordSize> anchorFive_{};
   html_features::UrlRecord scratch_;

@@ -3,6 +3,7 @@
 namespace html_features {
 
 void LexemeSummary::lexeme(const lex::LexemeStats& s) {
+  if (observer != nullptr) observer->lexeme(s);
   if (s.first_value == 0 || (s.third_value & kExclusionMask) != 0) return;
   const int band = WeightBand(s.first_value);
   lexemeSum[band] += s.first_value;
@@ -12,6 +13,7 @@ void LexemeSummary::lexeme(const lex::LexemeStats& s) {
 }
 
 void LexemeSummary::phrase(const LexemeDB::Phrase& p, std::uint16_t items) {
+  if (observer != nullptr) observer->phrase(p);
   const lex::LexemeStats& s = p.stats;
   if ((s.third_value & kExclusionMask) != 0) return;
   const int band = WeightBand(s.first_value);

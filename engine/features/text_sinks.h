@@ -59,6 +59,16 @@ class TextToString final : public html::DecrunchInterfaces::TextHandler {
   std::string text_;
 };
 
+// Hears every lexeme and phrase a word finder of the extractor matches, whatever its weight
+// or flags, before the extractor weighs it: for tools that ask which words of the lexicon a
+// text holds. The references point into the lexeme database.
+class LexemeObserverI {
+ public:
+  virtual void lexeme(const lex::LexemeStats& stats) = 0;
+  virtual void phrase(const LexemeDB::Phrase& phrase) = 0;
+  virtual ~LexemeObserverI() = default;
+};
+
 // Weight bands of lexeme and phrase hits: up to 30, 31 to 65, 66 and more.
 inline int WeightBand(double w) { return w <= 30 ? 0 : w < 66 ? 1 : 2; }
 
@@ -77,6 +87,7 @@ struct LexemeSummary {
   std::uint64_t phraseHits[3] = {0, 0, 0};
   std::uint32_t flags = 0;
   std::set<std::uint32_t> keys;
+  LexemeObserverI* observer = nullptr;  // not owned; may be null
 
   // The finder's handler operations.
   void word() { ++words; }
@@ -110,6 +121,7 @@ class TitleLexer final : public html::DecrunchInterfaces::TextHandler {
   }
 
   const LexemeSummary& summary() const { return summary_; }
+  void setObserver(LexemeObserverI* observer) { summary_.observer = observer; }
   std::uint64_t bytes() const { return bytes_; }
 
  private:

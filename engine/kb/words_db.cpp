@@ -232,6 +232,21 @@ const typename WordsDB<Ch, Stats>::PhraseHead* WordsDB<Ch, Stats>::HeadOf(
   return index < heads_.size() ? &heads_[index] : nullptr;
 }
 
+template <class Ch, class Stats>
+std::uint32_t WordsDB<Ch, Stats>::TermOfStats(const Stats* stats) const {
+  if (stats == nullptr) return 0;
+  // Compared as addresses: a pointer into another array must not be subtracted.
+  const auto address = reinterpret_cast<std::uintptr_t>(stats);
+  const auto begin = reinterpret_cast<std::uintptr_t>(stats_.data());
+  if (address >= begin && address < begin + stats_.size() * sizeof(Stats)) {
+    return static_cast<std::uint32_t>((address - begin) / sizeof(Stats));  // 0: the reserved one
+  }
+  for (std::size_t i = 0; i < heads_.size(); ++i) {
+    if (&heads_[i].stats == stats) return static_cast<std::uint32_t>(i) | kPhraseHeadBit;
+  }
+  return 0;
+}
+
 template class WordsDB<char, LexemeStats>;
 
 void LoadWordsDB(ap::FileSystemI& container, WordsDB<char, LexemeStats>& db) {

@@ -78,6 +78,9 @@ class WordsDB {
   const Stats* StatsOf(std::uint32_t term) const;
   // The phrase-head record of a phrase-head id, or nullptr.
   const PhraseHead* HeadOf(std::uint32_t term) const;
+  // The term id whose statistics `stats` points at (an ordinary term or a phrase head), or 0
+  // when it points at none of this database's.
+  std::uint32_t TermOfStats(const Stats* stats) const;
   const std::vector<Phrase>& phrases() const { return phrases_; }
   const std::vector<PhraseItem>& items() const { return items_; }
 

@@ -110,22 +110,80 @@ class SplitTest(unittest.TestCase):
 
 
 class TrainTest(unittest.TestCase):
-    def test_learns_the_signal_and_is_reproducible(self):
-        X, y = synthetic(n=600)
-        labels = ["phishing" if v else "ham-hard" for v in y]
+    def fit_synthetic(self, seed=7, fit_X=None, n=600):
+        X, y = synthetic(n=n)
+        labels = ["phishing" if v else ("ham-hard" if i % 4 == 0 else "ham")
+                  for i, v in enumerate(y)]
         groups = ["m%d" % i for i in range(len(y))]
         trusted = np.zeros(len(y), dtype=bool)
-        first = tr.train("mail", X, labels, groups, trusted, 7)
-        second = tr.train("mail", X, labels, groups, trusted, 7)
+        part = pt.group_split(groups, labels, seed=seed)
+        return X, y, labels, part, tr.train("mail", X, labels, groups, trusted, part, seed,
+                                            fit_X)
+
+    def test_learns_the_signal_and_is_reproducible(self):
+        X, y, labels, part, first = self.fit_synthetic()
+        second = self.fit_synthetic()[4]
         self.assertEqual(pt.format_network(first[1], first[2]),
                          pt.format_network(second[1], second[2]))
-        outs, part = first[3], first[5]
+        self.assertEqual(first[3:], second[3:])
+        rules, W, b = first[:3]
+        outs = pt.net_outputs(pt.encode_rules(X, rules), W, b)
         test = part == "test"
         auc = pt.roc_auc(outs[test, 0], y[test])
         self.assertGreater(auc, 0.9)
         # Feature 0 is larger in phishing: its top step must weigh more than its bottom one.
-        n0 = len(first[0][0])
-        self.assertGreater(first[1][0][n0 - 1], first[1][0][0])
+        n0 = len(rules[0])
+        self.assertGreater(W[0][n0 - 1], W[0][0])
+        self.assertGreater(first[5], 0.0)  # some phishing detected within the budgets
+
+    def test_thresholds_keep_the_budgets_out_of_fold(self):
+        X, y, labels, part, got = self.fit_synthetic(n=900)
+        thr, loud = got[3], got[4]
+        self.assertLessEqual(loud, thr)
+        # Refit the folds as train() does and count the flagged negatives of each class.
+        dev = (part == "train") | (part == "calib")
+        groups = ["m%d" % i for i in range(len(y))]
+        fold = tr.fold_of(groups, tr.CV_FOLDS, 7)
+        oof = np.full(len(y), np.inf, dtype=np.float32)
+        trusted = np.zeros(len(y), dtype=bool)
+        for k in range(tr.CV_FOLDS):
+            model = tr.fit(X, labels, dev & (fold != k), 7, pt.CHANNEL_QUANTILES["mail"])
+            held = dev & (fold == k)
+            oof[held] = tr.radii(X[held], model, trusted[held])
+        lab = np.array(labels)
+        for cls, (budget, _) in pt.BUDGETS["mail"].items():
+            neg = dev & (lab == cls)
+            flagged = int((oof[neg] <= np.float32(thr)).sum())
+            self.assertLessEqual(flagged, int(budget * neg.sum() + 1e-9))
+
+    def test_fit_vectors_replace_the_fitting_data(self):
+        X, y = synthetic(n=600)
+        # Feature 2 is a perfect sign in what the engine sees, absent from what is fitted on.
+        X[:, 2] = np.where(y, 5.0, 0.0)
+        fit_X = X.copy()
+        fit_X[:, 2] = 0.0
+        labels = ["phishing" if v else "ham" for v in y]
+        groups = ["m%d" % i for i in range(len(y))]
+        part = pt.group_split(groups, labels, seed=3)
+        got = tr.train("mail", X, labels, groups, np.zeros(len(y), dtype=bool), part, 3, fit_X)
+        self.assertEqual(got[0][2], [])  # never above 0 in the fitting data: dropped
+
+    def test_sample_weights_balance_every_class(self):
+        labels = ["phishing"] * 60 + ["ham"] * 30 + ["ham-hard"] * 10
+        w = pt.sample_weights(labels)
+        lab = np.array(labels)
+        tot = {c: w[lab == c].sum() for c in ("phishing", "ham", "ham-hard")}
+        self.assertAlmostEqual(tot["phishing"], tot["ham"] + tot["ham-hard"])
+        self.assertAlmostEqual(tot["ham"], tot["ham-hard"])
+        self.assertAlmostEqual(w.sum(), len(labels))
+
+    def test_split_of_the_lists_alone(self):
+        labels = {"f%03d" % i: ("phishing" if i % 3 else "ham", "g%d" % (i // 2))
+                  for i in range(300)}
+        whole = pt.split_files(labels, 4)
+        again = pt.split_files(dict(reversed(list(labels.items()))), 4)
+        self.assertEqual(whole, again)  # the order of the list does not matter
+        self.assertEqual(set(whole.values()), {"train", "calib", "test"})
 
     def test_auc_and_interval(self):
         self.assertEqual(pt.roc_auc([0.1, 0.2, 0.8, 0.9], [0, 0, 1, 1]), 1.0)

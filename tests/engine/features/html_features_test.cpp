@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cmath>
 #include <random>
 #include <set>
@@ -10,6 +11,7 @@
 
 #include "engine/features/event_recorder.h"
 #include "engine/features/feature_layout.h"
+#include "engine/features/text_sinks.h"
 #include "engine/html/decrunch.h"
 #include "tests/support/features_test_support.h"
 
@@ -298,6 +300,65 @@ TEST(HTMLFeatures, ChunkInvariance) {
     EXPECT_EQ(r.vector, whole.vector) << "round " << round;
     EXPECT_EQ(r.target, whole.target);
   }
+}
+
+// Records every match the observer hears: the term of a lexeme's statistics, or the index of
+// a phrase (as "p" and its index).
+struct MatchLog final : LexemeObserverI {
+  explicit MatchLog(const features_test::LexemeDB& db) : db(db) {}
+  void lexeme(const lex::LexemeStats& stats) override {
+    got.push_back(std::to_string(db.TermOfStats(&stats)));
+  }
+  void phrase(const html_features::LexemeDB::Phrase& p) override {
+    got.push_back("p" + std::to_string(&p - db.phrases().data()));
+  }
+  const features_test::LexemeDB& db;
+  std::vector<std::string> got;
+};
+
+TEST(HTMLFeatures, LexemeObserverHearsEveryMatchWhateverTheChunking) {
+  const features_test::LexemeDB db = features_test::Lexemes(features_test::kDefaultLexemes);
+  const auto term = [&](const char* word) { return std::to_string(db.FindTerm(word)); };
+  std::string html =
+      "<html><head><title>PayPal</title></head><body><div>Verify your account now</div>"
+      "<div>urgent: sign in</div><script>var a='secure login';</script><br>"
+      "<a href=\"/x\">password</a><br></body></html>";
+  for (int i = 0; i < 30; ++i) html += "<div>login " + std::to_string(i) + "</div>";
+  html += "<br>";  // page text reaches the extractor when a block tag flushes it
+  features_test::World world = features_test::DefaultWorld();
+  auto run = [&](std::size_t chunk, std::mt19937* rng) {
+    MatchLog log(db);
+    HTMLFeatures features("https://paypal-login.example/verify", world, db);
+    features.setLexemeObserver(&log);
+    {
+      html::Decrunch pipeline(features, false);
+      for (std::size_t i = 0; i < html.size();) {
+        std::size_t n = rng != nullptr ? 1 + (*rng)() % 64 : chunk;
+        n = std::min(n, html.size() - i);
+        pipeline.feed(html.data() + i, n);
+        i += n;
+      }
+    }
+    features.setLexemeObserver(nullptr);
+    return log.got;
+  };
+  const std::vector<std::string> whole = run(html.size(), nullptr);
+  const auto count = [&](const std::string& id) {
+    return std::count(whole.begin(), whole.end(), id);
+  };
+  EXPECT_EQ(count(term("paypal")), 1);  // the title
+  EXPECT_EQ(count(term("verify")), 1);  // a phrase head only: heard as its head term
+  EXPECT_EQ(count(term("account")), 1);
+  EXPECT_EQ(count(term("urgent")), 1);
+  EXPECT_EQ(count(term("in")), 1);        // weight 0: not weighed, still heard
+  EXPECT_EQ(count(term("secure")), 1);    // script text
+  EXPECT_EQ(count(term("login")), 31);    // script text and 30 blocks
+  EXPECT_EQ(count(term("password")), 2);  // anchor text: as page text and as the anchor's own
+  EXPECT_EQ(count("p0"), 1);              // sign(1)in
+  EXPECT_EQ(count("p1"), 1);              // verify(2)account
+  EXPECT_EQ(run(1, nullptr), whole);
+  std::mt19937 rng(5);
+  for (int round = 0; round < 10; ++round) EXPECT_EQ(run(0, &rng), whole) << "round " << round;
 }
 
 TEST(HTMLFeatures, HostileBudgets) {

@@ -136,6 +136,22 @@ TEST(WordsDB, PhrasesAndTheirHeads) {
 }
 
 // Only phrase lines before an empty lexeme: everything named becomes a phrase head.
+TEST(WordsDB, TermOfStatsFindsOrdinaryTermsAndPhraseHeads) {
+  const auto db = Load("verify(2)account 40 0 1\npaypal 50 101 0\nverify 7 0 0\n");
+  for (const char* word : {"paypal", "verify", "account"}) {
+    const std::uint32_t term = db->FindTerm(word);
+    ASSERT_NE(term, 0u) << word;
+    EXPECT_EQ(db->TermOfStats(db->StatsOf(term)), term) << word;
+  }
+  EXPECT_NE(db->FindTerm("verify") & lex::kPhraseHeadBit, 0u);
+  const lex::LexemeStats elsewhere{};
+  EXPECT_EQ(db->TermOfStats(&elsewhere), 0u);
+  EXPECT_EQ(db->TermOfStats(nullptr), 0u);
+  // A phrase's own statistics are no term's.
+  ASSERT_EQ(db->phrases().size(), 1u);
+  EXPECT_EQ(db->TermOfStats(&db->phrases()[0].stats), 0u);
+}
+
 TEST(WordsDB, PhrasesWithoutLexemeLines) {
   const auto db = Load("a(1)b 1 1\n c 1 1\n");
   EXPECT_NE(db->FindTerm("b") & lex::kPhraseHeadBit, 0u);
