@@ -44,27 +44,14 @@ BENCHMARK(BM_DecrunchSyntheticPage);
 
 // A page of ordinary meta refreshes (whose targets are no data URL) against plain text of the
 // same size: the refreshes should cost what their bytes cost.
-std::string RefreshFlood() {
-  std::string page;
-  while (page.size() < 2'300'000) {
-    page += "<meta http-equiv=\"refresh\" content=\"0; url=https://example.test/" +
-            std::string(1100, 'p') + "\">\n";
-  }
-  return page;
-}
-
 void BM_DecrunchRefreshFlood(benchmark::State& state) {
-  static const std::vector<std::string> page = {RefreshFlood()};
+  static const std::vector<std::string> page = {bench_pages::RefreshFlood()};
   DecrunchDocuments(state, page);
 }
 BENCHMARK(BM_DecrunchRefreshFlood);
 
 void BM_DecrunchShortRefreshFlood(benchmark::State& state) {
-  static const std::vector<std::string> page = [] {
-    std::string flood;
-    for (int i = 0; i < 50000; ++i) flood += "<meta http-equiv=refresh content='5;url=/a'>";
-    return std::vector<std::string>{flood};
-  }();
+  static const std::vector<std::string> page = {bench_pages::ShortRefreshFlood()};
   DecrunchDocuments(state, page);
 }
 BENCHMARK(BM_DecrunchShortRefreshFlood);
@@ -81,11 +68,7 @@ void BM_DecrunchShortTags(benchmark::State& state) {
 BENCHMARK(BM_DecrunchShortTags);
 
 void BM_DecrunchPlainText(benchmark::State& state) {
-  static const std::vector<std::string> page = [] {
-    std::string text;
-    while (text.size() < 2'300'000) text += "Plain words of a page, line after line.\n";
-    return std::vector<std::string>{text + "<br>"};
-  }();
+  static const std::vector<std::string> page = {bench_pages::PlainText()};
   DecrunchDocuments(state, page);
 }
 BENCHMARK(BM_DecrunchPlainText);

@@ -65,4 +65,28 @@ inline std::vector<std::string> CorpusDocuments() {
   return documents;
 }
 
+// 2.3 MB of plain text, closed by a tag that flushes it.
+inline std::string PlainText() {
+  std::string text;
+  while (text.size() < 2'300'000) text += "Plain words of a page, line after line.\n";
+  return text + "<br>";
+}
+
+// 2.3 MB of ordinary meta refreshes with 1.1 KB targets.
+inline std::string RefreshFlood() {
+  std::string page;
+  while (page.size() < 2'300'000) {
+    page += "<meta http-equiv=\"refresh\" content=\"0; url=https://example.test/" +
+            std::string(1100, 'p') + "\">\n";
+  }
+  return page;
+}
+
+// 50,000 short meta refreshes (2.2 MB).
+inline std::string ShortRefreshFlood() {
+  std::string flood;
+  for (int i = 0; i < 50000; ++i) flood += "<meta http-equiv=refresh content='5;url=/a'>";
+  return flood;
+}
+
 }  // namespace bench_pages

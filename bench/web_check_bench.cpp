@@ -87,6 +87,32 @@ void BM_WebCheckSynthetic(benchmark::State& state) {
 }
 BENCHMARK(BM_WebCheckSynthetic)->Unit(benchmark::kMillisecond);
 
+// Hostile pages against plain text of about the same size, through the whole check: a page
+// of meta refreshes should cost no more per byte than text.
+void WebCheckPage(benchmark::State& state, const std::string& page) {
+  IHttpSessionFactory* sessions = TheService().sessions();
+  if (sessions == nullptr) return state.SkipWithError("the knowledge base did not load");
+  for (auto _ : state) {
+    if (!Check(sessions, page)) return state.SkipWithError("no session");
+  }
+  state.SetBytesProcessed(static_cast<std::int64_t>(state.iterations() * page.size()));
+}
+void BM_WebCheckPlainText(benchmark::State& state) {
+  static const std::string page = bench_pages::PlainText();
+  WebCheckPage(state, page);
+}
+BENCHMARK(BM_WebCheckPlainText)->Unit(benchmark::kMillisecond);
+void BM_WebCheckRefreshFlood(benchmark::State& state) {
+  static const std::string page = bench_pages::RefreshFlood();
+  WebCheckPage(state, page);
+}
+BENCHMARK(BM_WebCheckRefreshFlood)->Unit(benchmark::kMillisecond);
+void BM_WebCheckShortRefreshFlood(benchmark::State& state) {
+  static const std::string page = bench_pages::ShortRefreshFlood();
+  WebCheckPage(state, page);
+}
+BENCHMARK(BM_WebCheckShortRefreshFlood)->Unit(benchmark::kMillisecond);
+
 void BM_WebCheckCorpus(benchmark::State& state) {
   IHttpSessionFactory* sessions = TheService().sessions();
   if (sessions == nullptr) return state.SkipWithError("the knowledge base did not load");

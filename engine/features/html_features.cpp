@@ -80,7 +80,12 @@ void HTMLFeatures::Impl::mark(std::uint32_t key, int kind, float n) {
 bool HTMLFeatures::Impl::foreign(const UrlRecord& r) const {
   if (mail_ || !page_.parts.hasHost) return true;
   if (page_.key != 0 && r.key == page_.key) return false;
-  return RegistrableDomain(r.parts.host) != pageRegistrable_;
+  const std::string& host = r.parts.host;
+  if (const auto known = foreignHosts_.find(host); known != foreignHosts_.end())
+    return known->second;
+  const bool answer = RegistrableDomain(host) != pageRegistrable_;
+  if (foreignHosts_.size() < kMaxForeignHosts) foreignHosts_.emplace(host, answer);
+  return answer;
 }
 
 // --- words --------------------------------------------------------------------------------

@@ -6,6 +6,7 @@
 #include <cstdint>
 #include <map>
 #include <string>
+#include <unordered_map>
 #include <vector>
 
 #include "engine/features/event_recorder.h"
@@ -17,6 +18,9 @@ namespace ap {
 
 // Organisations the domain-kind map holds; a page naming more adds nothing to it.
 inline constexpr std::size_t kMaxDomainKinds = 4096;
+// Hosts whose site is remembered per page (own or foreign); past this many, a new host is
+// asked about every time it comes.
+inline constexpr std::size_t kMaxForeignHosts = 1024;
 
 class HTMLFeatures::Impl {
  public:
@@ -92,6 +96,9 @@ class HTMLFeatures::Impl {
   const LexemeDB& lexemes_;
   html_features::UrlRecord page_;
   std::string pageRegistrable_;
+  // The answers of foreign() by host: a page links to few hosts many times, and the
+  // registrable domain is costly to find.
+  mutable std::unordered_map<std::string, bool> foreignHosts_;
   bool pageCategorised_ = false;
   WhiteDomainI& lookup_;
   std::int64_t lastSensitive_ = -1;

@@ -27,8 +27,23 @@ void ForEachRun(std::string_view text, F&& run) {
 }
 
 const lex::LexemeStats* RunLexeme(std::string_view run, const LexemeDB& lexemes) {
-  const std::string word = lex::NormalizeLine(run);
-  return lexemes.StatsOf(lexemes.FindTerm(word));
+  // A run of ASCII letters and digits normalises to itself lower-cased: walk the trie with
+  // it directly. Other runs go through the loader's normalisation.
+  const auto& trie = lexemes.trie();
+  auto node = LexemeDB::Trie::kRoot;
+  for (const char c : run) {
+    const auto byte = static_cast<unsigned char>(c);
+    if (byte >= 0x80) return lexemes.StatsOf(lexemes.FindTerm(lex::NormalizeLine(run)));
+    node = trie.Child(node, static_cast<char>(byte >= 'A' && byte <= 'Z' ? byte + 32 : byte));
+    if (node == LexemeDB::Trie::kNoNode) {
+      // No lexeme starts so; the rest must still be ASCII for that to be the answer.
+      for (const char rest : run)
+        if (static_cast<unsigned char>(rest) >= 0x80)
+          return lexemes.StatsOf(lexemes.FindTerm(lex::NormalizeLine(run)));
+      return nullptr;
+    }
+  }
+  return lexemes.StatsOf(run.empty() ? 0 : trie.Term(node));
 }
 
 std::size_t CharCount(std::string_view bytes) {

@@ -9,6 +9,7 @@
 #include <cstdint>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <memory>
 
 namespace html_features {
@@ -25,21 +26,28 @@ int HexValue(char c) {
 }
 
 // What browsers drop before reading a URL: leading and trailing C0 controls and spaces,
-// and every tab, CR and LF.
-std::string Clean(std::string_view url) {
+// and every tab, CR and LF. The result is a view of `url` itself when it holds no tab, CR
+// or LF (the usual case), else of `buffer`.
+std::string_view Clean(std::string_view url, std::string& buffer) {
   std::size_t b = 0, e = url.size();
   while (b < e && static_cast<unsigned char>(url[b]) <= 0x20) ++b;
   while (e > b && static_cast<unsigned char>(url[e - 1]) <= 0x20) --e;
   url = url.substr(b, e - b);
-  std::string out;
-  out.reserve(url.size());
-  while (!url.empty()) {
-    const std::size_t cut = url.find_first_of("\t\n\r");
-    out.append(url.substr(0, cut));
-    if (cut == std::string_view::npos) break;
-    url.remove_prefix(cut + 1);
-  }
-  return out;
+  const auto has = [url](char c) { return std::memchr(url.data(), c, url.size()) != nullptr; };
+  if (url.empty() || (!has('\t') && !has('\n') && !has('\r'))) return url;
+  buffer.clear();
+  for (const char c : url)
+    if (c != '\t' && c != '\n' && c != '\r') buffer.push_back(c);
+  return buffer;
+}
+
+// http or https, in any case.
+bool IsWebScheme(std::string_view scheme) {
+  if (scheme.size() != 4 && scheme.size() != 5) return false;
+  char lower[5];
+  for (std::size_t i = 0; i < scheme.size(); ++i) lower[i] = LowerAscii(scheme[i]);
+  const std::string_view name(lower, scheme.size());
+  return name == "http" || name == "https";
 }
 
 // Browsers refuse a host that holds any of these once percent-decoded.
@@ -236,18 +244,27 @@ void SplitUrl(std::string_view url, UrlParts& parts) {
   parts.unicodeHost.clear();
   parts.path.clear();
 
-  const std::string s = Clean(url);
+  // A URL of another scheme is refused on its scheme alone, without cleaning it whole (a
+  // data: URL can be megabytes long): cleaning keeps every ':', so the cleaned text up to
+  // the first ':' is the start of the cleaned URL.
+  if (const std::size_t colon = url.find(':'); colon != std::string_view::npos) {
+    const std::string_view head = Clean(url.substr(0, colon + 1), parts.cleaned);
+    bool scheme = head.size() >= 2 && IsAsciiAlpha(head[0]);
+    for (std::size_t i = 1; scheme && i + 1 < head.size(); ++i) {
+      const char c = head[i];
+      scheme = IsAsciiAlpha(c) || IsAsciiDigit(c) || c == '+' || c == '-' || c == '.';
+    }
+    if (scheme && !IsWebScheme(head.substr(0, head.size() - 1))) return;  // no web link
+  }
+  const std::string_view s = Clean(url, parts.cleaned);
   std::size_t pos = 0;
-  // A scheme: a letter, then letters, digits, '+', '-' or '.', then ':'.
   if (!s.empty() && IsAsciiAlpha(s[0])) {
     std::size_t i = 1;
     while (i < s.size() &&
            (IsAsciiAlpha(s[i]) || IsAsciiDigit(s[i]) || s[i] == '+' || s[i] == '-' || s[i] == '.'))
       ++i;
     if (i < s.size() && s[i] == ':') {
-      std::string scheme = s.substr(0, i);
-      for (char& c : scheme) c = LowerAscii(c);
-      if (scheme != "http" && scheme != "https") return;  // no web link
+      if (!IsWebScheme(s.substr(0, i))) return;  // no web link
       parts.linkClass = LinkClass::kAbsolute;
       pos = i + 1;
     }
@@ -291,10 +308,11 @@ void SplitUrl(std::string_view url, UrlParts& parts) {
     if (value > 65535) return;
   }
 
-  parts.path = s.substr(end);
-  const std::size_t query = parts.path.find_first_of("?#");
-  for (std::size_t i = 0; i < parts.path.size() && i < query; ++i)
-    if (parts.path[i] == '\\') parts.path[i] = '/';
+  parts.path.assign(s.substr(end));
+  for (char& c : parts.path) {
+    if (c == '?' || c == '#') break;
+    if (c == '\\') c = '/';
+  }
 
   if (host.empty() || host.size() > kMaxHostBytes) return;
   if (host[0] == '[') {
@@ -303,7 +321,7 @@ void SplitUrl(std::string_view url, UrlParts& parts) {
     parts.hasHost = true;
     return;
   }
-  std::string decoded;
+  std::string& decoded = parts.decoded;
   PercentDecode(host, decoded);
   if (!ToAsciiHost(decoded, parts.host, parts.unicodeHost)) return;
   if (EndsInNumber(parts.host)) {

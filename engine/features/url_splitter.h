@@ -29,6 +29,8 @@ struct UrlParts {
   std::string host;         // ASCII (punycode) form, lower case: what look-ups use
   std::string unicodeHost;  // the same host in Unicode (UTF-8), for lexeme matching
   std::string path;         // everything after the host and port: path, query, fragment
+  // Working space of SplitUrl, kept so that splitting one URL after another reuses memory.
+  std::string cleaned, decoded;
 };
 
 // Splits `url`. The parts are overwritten; a URL of another scheme, a relative reference or

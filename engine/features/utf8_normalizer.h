@@ -4,6 +4,7 @@
 // Malformed text is never refused: stray bytes become part of the current word.
 #pragma once
 
+#include <array>
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
@@ -29,6 +30,31 @@ class UTF8Normalizer {
   explicit UTF8Normalizer(Finder& finder) : finder_(finder) {}
 
   void text(const char* data, std::size_t length) {
+    const auto* p = reinterpret_cast<const unsigned char*>(data);
+    const auto* const end = p + length;
+    while (p != end) {
+      // Plain ASCII outside a reference or a sequence, the bulk of most text, is read here:
+      // what byte() would do for it, without its tests.
+      if (!inReference_ && pending_ == 0) {
+        for (; p != end; ++p) {
+          const std::uint8_t kind = kAscii[*p];
+          if (kind == kWordEnd) {
+            finder_.wordEnd();
+          } else if (kind != kOther) {
+            finder_.feed(kind);
+          } else {
+            break;
+          }
+        }
+        if (p == end) break;
+      }
+      byte(*p++);
+    }
+  }
+
+  // The per-byte reader alone, without the ASCII path of text(): the reference that path
+  // is tested against.
+  void textByteByByte(const char* data, std::size_t length) {
     for (std::size_t i = 0; i < length; ++i) byte(static_cast<unsigned char>(data[i]));
   }
 
@@ -143,6 +169,25 @@ class UTF8Normalizer {
     seqCount_ = 0;
     pending_ = 0;
   }
+
+  // What a byte means on the ASCII path: the byte to feed (lower-cased), a word end, or
+  // kOther for '&' and every byte from 0x80 on, which take the per-byte path.
+  static constexpr std::uint8_t kWordEnd = 0;
+  static constexpr std::uint8_t kOther = 0xFF;
+  static constexpr auto kAscii = [] {
+    std::array<std::uint8_t, 256> table{};
+    for (unsigned c = 0; c < 256; ++c) {
+      const auto b = static_cast<unsigned char>(c);
+      if (c >= 0x80 || c == '&' || (c == 0 && !Delimeters::isDelimiter(b))) {
+        table[c] = kOther;
+      } else if (Delimeters::isDelimiter(b)) {
+        table[c] = kWordEnd;
+      } else {
+        table[c] = static_cast<std::uint8_t>(c >= 'A' && c <= 'Z' ? c + 32 : c);
+      }
+    }
+    return table;
+  }();
 
   Finder& finder_;
   bool inReference_ = false;

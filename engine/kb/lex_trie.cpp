@@ -10,6 +10,7 @@ namespace lex {
 template <class Ch, class Stats>
 Character<Ch, Stats>::Character() {
   std::fill(std::begin(free_runs_), std::end(free_runs_), kNoNode);
+  std::fill(std::begin(root_), std::end(root_), kNoNode);
   nodes_.resize(1 + kRootRoom);
   nodes_[kRoot].first = 1;
 }
@@ -87,6 +88,7 @@ typename Character<Ch, Stats>::NodeId Character<Ch, Stats>::AddChild(NodeId pare
   child.character = c;
   ++nodes_[parent].count;
   UpdateMode(parent);
+  if (parent == kRoot) UpdateRootTable();
   return static_cast<NodeId>(first + position);
 }
 
@@ -120,34 +122,11 @@ typename Character<Ch, Stats>::NodeId Character<Ch, Stats>::Find(std::string_vie
 }
 
 template <class Ch, class Stats>
-typename Character<Ch, Stats>::NodeId Character<Ch, Stats>::Child(NodeId id, Ch c) const {
-  const Node& node = nodes_[id];
-  const auto byte = static_cast<std::uint8_t>(c);
-  const Node* children = nodes_.data() + node.first;
-  switch (static_cast<Mode>(node.value & 0xFF)) {
-    case kLeaf:
-      return kNoNode;
-    case kSingle:
-      return children[0].character == byte ? node.first : kNoNode;
-    case kRun: {
-      const unsigned index = static_cast<unsigned>(byte) - children[0].character;
-      return index < node.count ? node.first + index : kNoNode;
-    }
-    case kFew:
-      for (std::uint32_t i = 0; i < node.count; ++i) {
-        if (children[i].character == byte) return node.first + i;
-      }
-      return kNoNode;
-    case kMany: {
-      const Node* end = children + node.count;
-      const Node* found = std::lower_bound(
-          children, end, byte, [](const Node& n, std::uint8_t b) { return n.character < b; });
-      return (found != end && found->character == byte)
-                 ? node.first + static_cast<NodeId>(found - children)
-                 : kNoNode;
-    }
-  }
-  return kNoNode;
+void Character<Ch, Stats>::UpdateRootTable() {
+  std::fill(std::begin(root_), std::end(root_), kNoNode);
+  const Node& root = nodes_[kRoot];
+  for (std::uint32_t i = 0; i < root.count; ++i)
+    root_[nodes_[root.first + i].character] = root.first + i;
 }
 
 template class Character<char, LexemeStats>;

@@ -1,0 +1,307 @@
+// The feature extractor's fast paths against the plain code they stand for: the
+// normaliser's ASCII path against its per-byte reader, the trie's root table and inline step
+// against a set of words, the URL lexemes' ASCII walk against the loader's normalisation,
+// the URL splitter's early refusal of other schemes, and the per-page memory of own and
+// foreign hosts beyond its limit.
+#include <gtest/gtest.h>
+
+#include <map>
+#include <random>
+#include <set>
+#include <string>
+#include <vector>
+
+#include "engine/features/html_features.h"
+#include "engine/features/html_features_impl.h"
+#include "engine/features/url_record.h"
+#include "engine/features/url_splitter.h"
+#include "engine/features/utf8_normalizer.h"
+#include "engine/html/decrunch.h"
+#include "engine/kb/case_fold.h"
+#include "tests/support/features_test_support.h"
+
+namespace {
+
+using features_test::LexemeDB;
+
+// A finder that writes down every byte it is fed and every word end.
+struct Recorder {
+  std::string out;
+  void feed(unsigned char c) { out.push_back(static_cast<char>(c)); }
+  void wordEnd() { out += "|"; }
+};
+
+// Text made of what ends or extends the ASCII path: letters of both cases, digits,
+// delimiters, references whole, cut and unknown, UTF-8 sequences whole, cut short and
+// stray, folded and punctuation code points, CJK and bytes no sequence starts with.
+std::string HostileText(std::mt19937& rng, std::size_t pieces) {
+  static const std::vector<std::string> kPieces = {"a",
+                                                   "Z",
+                                                   "q",
+                                                   "7",
+                                                   " ",
+                                                   ".",
+                                                   "-",
+                                                   "'",
+                                                   "\n",
+                                                   "\t",
+                                                   "&",
+                                                   ";",
+                                                   "#",
+                                                   "&amp;",
+                                                   "&AMP;",
+                                                   "&lt",
+                                                   "&#65;",
+                                                   "&#x4a;",
+                                                   "&#xZZ;",
+                                                   "&nosuchname;",
+                                                   "&verylongreferencename;",
+                                                   "&#",
+                                                   "\xd0\x9f",
+                                                   "\xd0",
+                                                   "\xd0\xbf\xd0\xb0",
+                                                   "\xc3\x9f",
+                                                   "\xc3\x89",
+                                                   "\xe2\x80\x94",
+                                                   "\xe5\xaf\x86",
+                                                   "\xe5\xaf",
+                                                   "\x80",
+                                                   "\xbf",
+                                                   "\xf8",
+                                                   "\xff",
+                                                   "\xf0\x9f\x98\x80",
+                                                   "\xf0\x9f",
+                                                   "\xc2\xa0",
+                                                   "PayPal",
+                                                   "VERIFY",
+                                                   "account",
+                                                   "\x7f",
+                                                   std::string(1, '\0')};
+  std::string text;
+  for (std::size_t i = 0; i < pieces; ++i) text += kPieces[rng() % kPieces.size()];
+  return text;
+}
+
+TEST(NormalizerFastPath, AgreesWithThePerByteReaderInAnyChunking) {
+  std::mt19937 rng(20261207);
+  for (int round = 0; round < 400; ++round) {
+    const std::string text = HostileText(rng, 1 + rng() % 200);
+
+    Recorder reference;
+    lex::UTF8Normalizer<Recorder> slow(reference);
+    for (const char c : text) slow.textByteByByte(&c, 1);
+    slow.wordEnd();
+
+    Recorder fast;
+    lex::UTF8Normalizer<Recorder> normalizer(fast);
+    for (std::size_t i = 0; i < text.size();) {
+      const std::size_t n = std::min<std::size_t>(1 + rng() % 17, text.size() - i);
+      normalizer.text(text.data() + i, n);
+      i += n;
+    }
+    normalizer.wordEnd();
+    ASSERT_EQ(fast.out, reference.out) << "round " << round;
+
+    Recorder whole;
+    lex::UTF8Normalizer<Recorder> once(whole);
+    once.text(text.data(), text.size());
+    once.wordEnd();
+    ASSERT_EQ(whole.out, reference.out) << "round " << round;
+  }
+}
+
+TEST(NormalizerFastPath, BreaksBetweenChunksLandWhereThePerByteReaderPutsThem) {
+  std::mt19937 rng(7);
+  for (int round = 0; round < 300; ++round) {
+    const std::string text = HostileText(rng, 1 + rng() % 120);
+    std::vector<std::size_t> cuts;
+    std::vector<bool> breaks;
+    for (std::size_t i = 0; i < text.size();) {
+      const std::size_t n = std::min<std::size_t>(1 + rng() % 13, text.size() - i);
+      cuts.push_back(n);
+      breaks.push_back(rng() % 5 == 0);
+      i += n;
+    }
+    const auto run = [&](bool perByte) {
+      Recorder out;
+      lex::UTF8Normalizer<Recorder> n(out);
+      std::size_t at = 0;
+      for (std::size_t k = 0; k < cuts.size(); ++k) {
+        if (perByte) {
+          n.textByteByByte(text.data() + at, cuts[k]);
+        } else {
+          n.text(text.data() + at, cuts[k]);
+        }
+        if (breaks[k]) n.wordEnd();
+        at += cuts[k];
+      }
+      n.wordEnd();
+      return out.out;
+    };
+    ASSERT_EQ(run(false), run(true)) << "round " << round;
+  }
+}
+
+TEST(NormalizerFastPath, PlainAsciiIsLowerCasedAndCutAtDelimiters) {
+  Recorder out;
+  lex::UTF8Normalizer<Recorder> n(out);
+  const std::string text = "Hello, WORLD-wide_web 42!";
+  n.text(text.data(), text.size());
+  n.wordEnd();
+  EXPECT_EQ(out.out, "hello||world|wide|web|42||");  // every end is passed on
+}
+
+// Words of a few letters from a small alphabet (ASCII and UTF-8 lead and continuation
+// bytes), so that prefixes are shared and the root gains children in random order.
+TEST(LexemeTrie, RootTableAndInlineStepAgreeWithTheInsertedWords) {
+  std::mt19937 rng(99);
+  const std::string alphabet = "abcz09_\xc3\xd0\x9f\xbf\xe5\x01\x7f\xff";
+  for (int round = 0; round < 20; ++round) {
+    lex::Character<char, lex::LexemeStats> trie;
+    struct Terms final : lex::Character<char, lex::LexemeStats>::TermAllocator {
+      std::uint32_t next = 1;
+      std::uint32_t NewTerm() override { return next++; }
+      void SetStats(std::uint32_t, const lex::LexemeStats&) override {}
+    } terms;
+    std::map<std::string, std::uint32_t> words;
+    std::set<std::string> prefixes;
+    const int count = 1 + static_cast<int>(rng() % 600);
+    for (int i = 0; i < count; ++i) {
+      std::string word;
+      const std::size_t length = 1 + rng() % 5;
+      for (std::size_t k = 0; k < length; ++k) word += alphabet[rng() % alphabet.size()];
+      const std::uint32_t term = trie.Insert(word, terms, lex::LexemeStats{});
+      words.emplace(word, term);
+      for (std::size_t k = 1; k <= word.size(); ++k) prefixes.insert(word.substr(0, k));
+    }
+    for (int probe = 0; probe < 3000; ++probe) {
+      std::string word;
+      const std::size_t length = 1 + rng() % 6;
+      for (std::size_t k = 0; k < length; ++k) word += alphabet[rng() % alphabet.size()];
+      auto node = trie.kRoot;
+      for (const char c : word) {
+        node = trie.Child(node, c);
+        if (node == trie.kNoNode) break;
+      }
+      ASSERT_EQ(node != trie.kNoNode, prefixes.count(word) == 1) << round << " " << word;
+      const auto found = words.find(word);
+      if (node != trie.kNoNode) {
+        ASSERT_EQ(trie.Term(node), found == words.end() ? 0u : found->second) << word;
+      }
+    }
+    for (unsigned c = 0; c < 256; ++c) {
+      const std::string one(1, static_cast<char>(c));
+      EXPECT_EQ(trie.Child(trie.kRoot, static_cast<char>(c)) != trie.kNoNode,
+                prefixes.count(one) == 1);
+    }
+  }
+}
+
+// A run of letters and digits is looked up as the loader normalises it, whether it is
+// plain ASCII (walked directly) or not.
+TEST(UrlLexemes, AsciiWalkAgreesWithTheLoadersNormalisation) {
+  const LexemeDB db = features_test::Lexemes(
+      "paypal 50 101 0\n"
+      "login 25 0 0\n"
+      "stra\xc3\x9f"
+      "e 13 0 0\n"
+      "\xd0\xbf\xd0\xb0\xd1\x80\xd0\xbe\xd0\xbb\xd1\x8c 12 0 0\n"
+      "a1 5 0 0\n");
+  const std::vector<std::string> runs = {"paypal",
+                                         "PayPal",
+                                         "PAYPAL",
+                                         "paypa",
+                                         "paypall",
+                                         "Login",
+                                         "a1",
+                                         "A1",
+                                         "a",
+                                         "STRASSE",
+                                         "STRA\xc3\x9f"
+                                         "E",
+                                         "Stra\xc3\x9f"
+                                         "e",
+                                         "\xd0\x9f\xd0\x90\xd0\xa0\xd0\x9e\xd0\x9b\xd0\xac",
+                                         "pay\xc3\xa9pal",
+                                         "zz\xc3",
+                                         "x\x80"};
+  for (const std::string& run : runs) {
+    std::size_t none = 0;
+    const bool any = html_features::TextLexemes(run, db, nullptr, 0, none);
+    const bool expected = db.StatsOf(db.FindTerm(lex::NormalizeLine(run))) != nullptr;
+    EXPECT_EQ(any, expected) << run;
+  }
+  std::size_t none = 0;
+  EXPECT_TRUE(html_features::TextLexemes("PayPal", db, nullptr, 0, none));
+  EXPECT_TRUE(
+      html_features::TextLexemes("STRA\xc3\x9f"
+                                 "E",
+                                 db, nullptr, 0, none));
+  EXPECT_FALSE(html_features::TextLexemes("paypa", db, nullptr, 0, none));
+}
+
+// Another scheme is refused on its scheme; tabs and newlines inside a scheme are dropped
+// first, as browsers do, and a colon that ends no scheme leaves a relative reference.
+TEST(UrlSplitter, SchemesReadAsTheCleanedUrlReadsThem) {
+  struct Case {
+    std::string url;
+    html_features::LinkClass linkClass;
+    bool relative;
+    std::string host;
+  };
+  using html_features::LinkClass;
+  const std::string megabyte(1 << 20, 'A');
+  const std::vector<Case> cases = {
+      {"ht\ttp://Example.COM/a", LinkClass::kAbsolute, false, "example.com"},
+      {"  \x01HT\nTPS://a.example:443/x", LinkClass::kAbsolute, false, "a.example"},
+      {"java\tscript:http://evil.example/", LinkClass::kNone, false, ""},
+      {"data:text/html;base64," + megabyte, LinkClass::kNone, false, ""},
+      {"data:\t,http://x.example/", LinkClass::kNone, false, ""},
+      {"mailto:a@b.example", LinkClass::kNone, false, ""},
+      {"httpx://a.example/", LinkClass::kNone, false, ""},
+      {"a b:c", LinkClass::kNone, true, ""},
+      {"1http://a.example/", LinkClass::kNone, true, ""},
+      {":http://a.example/", LinkClass::kNone, true, ""},
+      {"/path?q=a:b", LinkClass::kNone, true, ""},
+      {"//cdn.example/a:b", LinkClass::kSchemeRelative, false, "cdn.example"},
+      {"\\\\cdn.example\\x", LinkClass::kSchemeRelative, false, "cdn.example"},
+      {"https:" + megabyte, LinkClass::kAbsolute, false, ""},
+  };
+  html_features::UrlParts parts;  // reused, as the extractor reuses it
+  for (const Case& c : cases) {
+    html_features::SplitUrl(c.url, parts);
+    EXPECT_EQ(parts.linkClass, c.linkClass) << c.url.substr(0, 40);
+    EXPECT_EQ(parts.relative, c.relative) << c.url.substr(0, 40);
+    EXPECT_EQ(parts.hasHost, !c.host.empty()) << c.url.substr(0, 40);
+    EXPECT_EQ(parts.host, c.host) << c.url.substr(0, 40);
+  }
+  html_features::SplitUrl("https://a.example/p\\q?r\\s", parts);
+  EXPECT_EQ(parts.path, "/p/q?r\\s");
+}
+
+// The extractor remembers kMaxForeignHosts hosts per page; hosts past that are asked about
+// each time and still counted right.
+TEST(HTMLFeatures, OwnAndForeignHostsBeyondTheRememberedOnes) {
+  auto lexemes = features_test::Lexemes(features_test::kDefaultLexemes);
+  auto world = features_test::DefaultWorld();
+  ap::HTMLFeatures features("https://www.shop.example.co.uk/", world, lexemes, nullptr);
+  std::string html;
+  const int hosts = static_cast<int>(ap::kMaxForeignHosts) + 300;
+  for (int round = 0; round < 2; ++round) {
+    for (int i = 0; i < hosts; ++i) {
+      html += "<form action=\"https://h" + std::to_string(i) + ".shop.example.co.uk/\"></form>";
+      html += "<form action=\"https://h" + std::to_string(i) + ".co.uk/\"></form>";
+    }
+  }
+  html::Decrunch pipeline(features, false);
+  pipeline.feed(html.data(), html.size());
+  std::string target;
+  std::vector<float> vector;
+  features.GetVector(target, vector, pipeline.byteCount());
+  float foreign = 0;
+  for (std::size_t s = 0; s < 3; ++s)
+    foreign += vector.at(html_features::SegmentBin(s, html_features::kEvFormForeign));
+  EXPECT_EQ(foreign, 2.0f * hosts);
+}
+
+}  // namespace
