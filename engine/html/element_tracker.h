@@ -7,11 +7,14 @@
 // Trusts nothing: the stack keeps at most kMaxOpenElements records and
 // kMaxOpenElementNameBytes of names; past that the oldest records are forgotten, not
 // closed. An end tag of an element that is not open costs one lookup.
+//
+// Every tag passes here, so names of up to seven bytes (nearly all of them) are handled as
+// their packed 64-bit keys: one packing per tag, counted in a small open-addressing table,
+// compared as integers. Longer names go through a string-keyed map.
 #pragma once
 
 #include <cstddef>
 #include <cstdint>
-#include <deque>
 #include <functional>
 #include <string>
 #include <string_view>
@@ -19,6 +22,33 @@
 #include <vector>
 
 namespace html_decrunch {
+
+// How many open elements have each packed name key (never 0). A key whose count falls to
+// zero keeps its slot while few are idle, so the usual elements cost no table change.
+class PackedNameCounts {
+ public:
+  std::size_t count(std::uint64_t key) const;
+  void add(std::uint64_t key);
+  void remove(std::uint64_t key);  // the key must have been added
+  std::size_t entries() const { return used_; }
+
+ private:
+  struct Slot {
+    std::uint64_t key = 0;  // 0: empty
+    std::size_t count = 0;
+  };
+  std::size_t home(std::uint64_t key) const {
+    return static_cast<std::size_t>((key * 0x9E3779B97F4A7C15ull) >> shift_);
+  }
+  std::size_t find(std::uint64_t key) const;  // its slot, or the empty slot it would take
+  void grow();
+  void eraseAt(std::size_t index);
+
+  std::vector<Slot> slots_;
+  unsigned shift_ = 64;
+  std::size_t used_ = 0;
+  std::size_t idle_ = 0;
+};
 
 class ElementTracker {
  public:
@@ -48,31 +78,42 @@ class ElementTracker {
   static constexpr std::int64_t kNone = -1;
 
   struct Record {
-    std::string name;
+    std::uint64_t key;   // packed name, or 0 for a name too long to pack
+    std::size_t nameAt;  // in names_
+    std::size_t nameSize;
     int kind;  // tracked kind, or -1
   };
 
+  std::string_view nameOf(const Record& record) const {
+    return std::string_view(names_.data() + record.nameAt, record.nameSize);
+  }
+  std::size_t liveRecords() const { return records_.size() - head_; }
+
   // Records are numbered from the first ever pushed, so numbers survive forgetting old ones.
-  std::int64_t topmost(std::string_view name) const;
+  std::int64_t topmost(std::string_view name, std::uint64_t key) const;
   void closeFrom(std::int64_t number);
-  void push(std::string_view name, int kind);
+  void push(std::string_view name, std::uint64_t key, int kind);
   void forgetOldest();
-  void removeName(const std::string& name);
+  void compact();
+  void removeName(const Record& record);
 
   Listener& listener_;
-  std::deque<Record> records_;
-  std::int64_t firstNumber_ = 0;  // number of records_.front()
-  std::size_t nameBytes_ = 0;
-  // Looked up by string_view without building a string.
+  // The open records are records_[head_..]; forgotten ones before head_ are dropped in bulk.
+  std::vector<Record> records_;
+  std::size_t head_ = 0;
+  std::string names_;             // the records' names, in push order
+  std::int64_t firstNumber_ = 0;  // number of records_[head_]
+  std::size_t nameBytes_ = 0;     // of the open records
+  PackedNameCounts packedCounts_;
+  // Long names: looked up by string_view without building a string.
   struct NameHash {
     using is_transparent = void;
     std::size_t operator()(std::string_view name) const {
       return std::hash<std::string_view>{}(name);
     }
   };
-  // Names open, and idle ones.
-  std::unordered_map<std::string, std::size_t, NameHash, std::equal_to<>> openCount_;
-  std::size_t idleNames_ = 0;                        // entries whose count is zero
+  std::unordered_map<std::string, std::size_t, NameHash, std::equal_to<>> longCounts_;
+  std::size_t idleLongNames_ = 0;                    // entries whose count is zero
   std::int64_t tracked_[3] = {kNone, kNone, kNone};  // a, button, select
   bool voidJustOpened_ = false;
   std::string voidName_;

@@ -24,8 +24,9 @@ constexpr std::array<std::uint64_t, 16> kVoidKeys = [] {
 
 }  // namespace
 
-bool isVoidElement(std::string_view name) {
-  const std::uint64_t key = packName(name);
+bool isVoidElement(std::string_view name) { return isVoidKey(packName(name)); }
+
+bool isVoidKey(std::uint64_t key) {
   if (key == 0) return false;
   return std::find(kVoidKeys.begin(), kVoidKeys.end(), key) != kVoidKeys.end();
 }
