@@ -186,6 +186,18 @@ class FastParserMachine
       }
       return util::Stay();
     }
+    // The name's bytes, up to the byte that ends it or the '-' that makes it "!--".
+    static constexpr bool kBulk = true;
+    const Byte* consume(const Byte* p, const Byte* end) override {
+      if (opened_) return p;
+      for (; p < end; ++p) {
+        const Byte b = *p;
+        if (kTagNameEnd.contains(b)) break;
+        if (b == '-' && name_.view() == StringView("!-")) break;
+        name_.append(toLowerAscii(b));
+      }
+      return p;
+    }
 
    private:
     Transition enterRawText(FastParserMachine& m) {
@@ -221,6 +233,11 @@ class FastParserMachine
       name_.append(toLowerAscii(b));
       return util::Stay();
     }
+    static constexpr bool kBulk = true;
+    const Byte* consume(const Byte* p, const Byte* end) override {
+      for (; p < end && !kTagNameEnd.contains(*p); ++p) name_.append(toLowerAscii(*p));
+      return p;
+    }
 
    private:
     TagName name_;
@@ -230,6 +247,8 @@ class FastParserMachine
   class CloseTagSkip final : public state_t {
    public:
     Transition process(Byte b) override { return b == '>' ? util::PopReprocess(1) : util::Stay(); }
+    static constexpr bool kBulk = true;
+    const Byte* consume(const Byte* p, const Byte* end) override { return findByte(p, end, '>'); }
   };
 
   using CommentSink = typename Config::CommentSink;
@@ -615,6 +634,8 @@ class FastParserMachine
   static constexpr ByteSet kUnquotedEnd{">", /*whitespace=*/true};
   static constexpr ByteSet kAttrNameEnd{">=", /*whitespace=*/true};
   static constexpr ByteSet kStreamedEnd{">/", /*whitespace=*/true};
+  // Where a tag's name ends.
+  static constexpr ByteSet kTagNameEnd{">", /*whitespace=*/true};
 
   Handler* handler_;
   bool selfClosing_ = false;

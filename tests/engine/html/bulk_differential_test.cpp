@@ -60,6 +60,13 @@ std::string RandomPage(std::mt19937& random) {
       "--",
       "-->",
       "<!--",
+      // Tag names: read in bulk up to their end, or to a '-' that makes them a comment.
+      "!",
+      "<!-",
+      "<DiV",
+      "</DiV  >",
+      "<my-long-element-name x=1>",
+      "</My-Long-Element-Name>",
       "*",
       "/*",
       "*/",
