@@ -173,21 +173,34 @@ void HTMLFeatures::Impl::formAction(std::string_view value) {
 void HTMLFeatures::Impl::frame(std::string_view value) {
   if (!value.empty()) events_.add(kEvFrame);
   analyse(value);
-  urlLexemes(scratch_.parts);
+  urlLexemes(scratch_);
 }
 
 // Codes 2 and 13-20: the lexemes of a link's host, or failing that of its path.
-void HTMLFeatures::Impl::urlLexemes(const UrlParts& parts) {
-  std::uint32_t keys[8];
+// The host's were found when the URL was analysed, unless its host channels were computed.
+void HTMLFeatures::Impl::urlLexemes(const UrlRecord& r) {
+  constexpr std::size_t kMaxKeys = UrlRecord::kMaxHostLexemeKeys;
+  std::uint32_t keys[kMaxKeys];
+  const std::uint32_t* found = keys;
   std::size_t count = 0;
-  bool any = parts.hasHost && TextLexemes(parts.unicodeHost, lexemes_, keys, 8, count);
-  if (!any) any = TextLexemes(parts.path, lexemes_, keys, 8, count);
+  bool any = false;
+  if (r.parts.hasHost && r.hostKeysKnown) {
+    any = r.hostLexemes;
+    found = r.hostKeys.data();
+    count = r.hostKeyCount;
+  } else if (r.parts.hasHost) {
+    any = TextLexemes(r.parts.unicodeHost, lexemes_, keys, kMaxKeys, count);
+  }
+  if (!any) {
+    found = keys;
+    any = TextLexemes(r.parts.path, lexemes_, keys, kMaxKeys, count);
+  }
   if (!any) return;
   if (count == 0) {
     events_.add(kEvUrlPlainLexeme);
     return;
   }
-  for (std::size_t i = 0; i < count; ++i) events_.add(kEvUrlOrgLexeme + domainIndex(keys[i]));
+  for (std::size_t i = 0; i < count; ++i) events_.add(kEvUrlOrgLexeme + domainIndex(found[i]));
 }
 
 void HTMLFeatures::Impl::scriptUrl(std::string_view value) {
@@ -227,7 +240,7 @@ void HTMLFeatures::Impl::anchor(std::string_view href) {
       events_.add(kEvAnchorUnknownHost);
     }
   }
-  urlLexemes(r.parts);
+  urlLexemes(r);
   anchorFive_ = r.five();
   inAnchor_ = true;
   anchorText_.start();

@@ -64,7 +64,7 @@ class HTMLFeatures::Impl {
   void styleSheet(std::string_view value);
   void formAction(std::string_view value);
   void frame(std::string_view value);
-  void urlLexemes(const html_features::UrlParts& parts);
+  void urlLexemes(const html_features::UrlRecord& r);
   void scriptUrl(std::string_view value);
   void anchor(std::string_view href);
   void anchorEnd(const std::string& text);

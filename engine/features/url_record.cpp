@@ -171,7 +171,8 @@ bool TextLexemes(std::string_view text, const LexemeDB& lexemes, std::uint32_t* 
 void AnalyseUrl(std::string_view url, ap::WhiteDomainI& lookup, const LexemeDB& lexemes,
                 bool hostFloats, UrlRecord& r) {
   SplitUrl(url, r.parts);
-  r.trusted = r.white = r.ip = r.hostLexemes = false;
+  r.trusted = r.white = r.ip = r.hostLexemes = r.hostKeysKnown = false;
+  r.hostKeyCount = 0;
   r.key = 0;
   r.category = 6;
   r.hostFloats.fill(0.0f);
@@ -192,8 +193,10 @@ void AnalyseUrl(std::string_view url, ap::WhiteDomainI& lookup, const LexemeDB& 
   if (hostFloats && !r.trusted) {
     HostChannels(r.parts.unicodeHost, lexemes, r);
   } else {
-    std::size_t none = 0;
-    r.hostLexemes = TextLexemes(r.parts.unicodeHost, lexemes, nullptr, 0, none);
+    // With the organisations its lexemes name, which links ask for next.
+    r.hostLexemes = TextLexemes(r.parts.unicodeHost, lexemes, r.hostKeys.data(), r.hostKeys.size(),
+                                r.hostKeyCount);
+    r.hostKeysKnown = true;
   }
 }
 

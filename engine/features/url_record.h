@@ -26,7 +26,13 @@ struct UrlRecord {
   bool white = false;        // on a white domain, not a share link
   bool ip = false;           // a dotted IPv4 address
   bool hostLexemes = false;  // some run of the host's letters and digits is a lexeme
-  std::uint32_t key = 0;     // the owning organisation, 0 when the host is not listed
+  // The organisations the host's lexemes name, as TextLexemes finds them (at most
+  // kMaxHostLexemeKeys); known when AnalyseUrl did not compute the host channels.
+  static constexpr std::size_t kMaxHostLexemeKeys = 8;
+  std::array<std::uint32_t, kMaxHostLexemeKeys> hostKeys{};
+  std::size_t hostKeyCount = 0;
+  bool hostKeysKnown = false;
+  std::uint32_t key = 0;  // the owning organisation, 0 when the host is not listed
   std::int32_t category = 6;
   std::array<float, 3 * kHostChannelSize> hostFloats{};
 
