@@ -15,20 +15,39 @@ constexpr std::array<std::string_view, 16> kVoidElements = {
 
 static_assert(std::is_sorted(kVoidElements.begin(), kVoidElements.end()));
 
-// The same names packed: every tag of a page is looked up here, twice for most.
-constexpr std::array<std::uint64_t, 16> kVoidKeys = [] {
-  std::array<std::uint64_t, 16> keys{};
-  for (std::size_t i = 0; i < keys.size(); ++i) keys[i] = packName(kVoidElements[i]);
-  return keys;
-}();
+// Every tag of a page is looked up here, twice for most: by the packed name's length (bits
+// 60 and up), then against the few void names of that length.
+constexpr bool voidKey(std::uint64_t key) {
+  switch (key >> 60) {
+    case 2:
+      return key == packName("br") || key == packName("hr");
+    case 3:
+      return key == packName("col") || key == packName("img") || key == packName("wbr");
+    case 4:
+      return key == packName("area") || key == packName("base") || key == packName("link") ||
+             key == packName("meta");
+    case 5:
+      return key == packName("embed") || key == packName("input") || key == packName("param") ||
+             key == packName("track");
+    case 6:
+      return key == packName("keygen") || key == packName("source");
+    case 7:
+      return key == packName("command");
+    default:
+      return false;
+  }
+}
+
+// The switch holds exactly the list.
+static_assert(std::all_of(kVoidElements.begin(), kVoidElements.end(),
+                          [](std::string_view name) { return voidKey(packName(name)); }));
+static_assert(!voidKey(packName("b")) && !voidKey(packName("div")) && !voidKey(packName("col2")) &&
+              !voidKey(packName("metas")) && !voidKey(0));
 
 }  // namespace
 
 bool isVoidElement(std::string_view name) { return isVoidKey(packName(name)); }
 
-bool isVoidKey(std::uint64_t key) {
-  if (key == 0) return false;
-  return std::find(kVoidKeys.begin(), kVoidKeys.end(), key) != kVoidKeys.end();
-}
+bool isVoidKey(std::uint64_t key) { return voidKey(key); }
 
 }  // namespace html
