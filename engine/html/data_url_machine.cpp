@@ -117,6 +117,13 @@ DataUrlMachine::DataUrlMachine(Handler& handler) : handler_(&handler) {
   pushState<WaitHeaderState>();
 }
 
+void DataUrlMachine::restart() {
+  popAll();
+  mediaType_ = "text/plain";
+  rejected_ = 0;
+  pushState<WaitHeaderState>();
+}
+
 void DataUrlMachine::feed(std::uint8_t byte) {
   const std::size_t before = rejected_;
   feedByte(byte);

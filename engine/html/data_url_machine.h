@@ -33,6 +33,9 @@ class DataUrlMachine : public util::StateMachine<char, DataUrlMachine> {
 
   explicit DataUrlMachine(Handler& handler);
 
+  // Starts on a new URL, as a machine just made would (its blocks are kept).
+  void restart();
+
   // One byte through the machine; throws ap::Error (kHeaderError) for a byte that does not
   // continue the scheme. The machine stays usable after the error.
   void feed(std::uint8_t byte);

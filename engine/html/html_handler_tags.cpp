@@ -114,13 +114,14 @@ void HtmlHandler::descriptionByte(std::uint8_t byte) {
 void HtmlHandler::refreshByte(std::uint8_t byte) {
   switch (refresh_.feed(byte)) {
     case RefreshParser::Step::kFirstUrl:
-      metaUrl_.reset();
       if (depth_ < html::kMaxDecrunchNesting) {
-        metaUrl_ = std::make_unique<DecrunchMetaUrl>(receiver_, depth_);
+        // One decoder serves every refresh of the page.
+        if (metaUrl_ == nullptr) metaUrl_ = std::make_unique<DecrunchMetaUrl>(receiver_, depth_);
+        metaUrl_->start();
       }
       [[fallthrough]];
     case RefreshParser::Step::kUrl:
-      if (metaUrl_ != nullptr) metaUrl_->feed(byte);
+      if (metaUrl_ != nullptr && metaUrl_->open()) metaUrl_->feed(byte);
       break;
     case RefreshParser::Step::kNone:
       break;
@@ -132,7 +133,7 @@ void HtmlHandler::refreshByte(std::uint8_t byte) {
 void HtmlHandler::refreshRun(const char* data, std::size_t length) {
   while (length > 0) {
     if (refresh_.inTarget()) {
-      if (metaUrl_ != nullptr) metaUrl_->feed(data, length);
+      if (metaUrl_ != nullptr && metaUrl_->open()) metaUrl_->feed(data, length);
       return;
     }
     if (refresh_.gaveUp()) {
@@ -267,7 +268,7 @@ bool HtmlHandler::metaEnd() {
     description->end();
   }
   refresh_.clearFallback();
-  metaUrl_.reset();
+  if (metaUrl_ != nullptr) metaUrl_->finish();
   return false;
 }
 

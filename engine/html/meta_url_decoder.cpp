@@ -7,17 +7,31 @@
 namespace html_decrunch {
 
 HtmlHandler::DecrunchMetaUrl::DecrunchMetaUrl(Receiver& receiver, std::size_t parentDepth)
-    : receiver_(receiver), parentDepth_(parentDepth), decoder_(*this) {
+    : receiver_(receiver), parentDepth_(parentDepth), decoder_(*this) {}
+
+HtmlHandler::DecrunchMetaUrl::~DecrunchMetaUrl() { finish(); }
+
+void HtmlHandler::DecrunchMetaUrl::start() {
+  finish();
+  decoder_.restart();
+  rejected_ = 0;
+  decodedCount_ = 0;
   receiver_.beginNested();
+  open_ = true;
 }
 
 // A page that was built ends itself; otherwise the nesting the receiver was told of ends here.
-HtmlHandler::DecrunchMetaUrl::~DecrunchMetaUrl() {
-  if (page_ != nullptr) return;
+void HtmlHandler::DecrunchMetaUrl::finish() noexcept {
+  if (!open_) return;
+  open_ = false;
+  if (page_ != nullptr) {
+    page_.reset();
+    return;
+  }
   try {
     receiver_.endNested();
   } catch (...) {
-    // A destructor cannot report the receiver's failure.
+    // Nobody is left to report the receiver's failure to.
   }
 }
 

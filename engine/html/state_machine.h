@@ -143,6 +143,12 @@ class StateMachine {
     return *state;
   }
 
+  // Pops every state, the bottom one too, for a machine that starts over: the concrete machine
+  // pushes its bottom state again. The arena keeps its last block, so this allocates nothing.
+  void popAll() {
+    while (top_ != nullptr) destroyTop();
+  }
+
   // Pops n states, the top one first. Removing the bottom state is a fault of the machine.
   void pop(std::size_t n) {
     if (n >= depth_)

@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <string>
+#include <vector>
 
 #include "tests/engine/html/scan_test_support.h"
 
@@ -69,6 +70,44 @@ TEST(DataUrl, OverLongHeaderTokensAreCut) {
   EXPECT_EQ(cut.bytes, "A");
   // A cut token can never pass for "base64".
   EXPECT_EQ(DecodeDataUrl("data:" + token + "base64,QQ==").bytes, "QQ==");
+}
+
+// A restarted machine reads the next URL exactly as a new one would, whatever state the last
+// URL left it in: mid-escape, mid-base64, in the header, or rejecting junk.
+TEST(DataUrl, RestartIsANewMachine) {
+  const std::vector<std::string> urls = {"data:text/html;base64,PGI+eDwvYj4=",
+                                         "data:image/png,%4",
+                                         "data:text/html;charset",
+                                         "http://x.test/",
+                                         "data:;base64,QUJD",
+                                         "data:,%41%zz",
+                                         "da",
+                                         "data:text/html,<b>x</b>"};
+  html_test::ByteRecorder reused;
+  utils::DataUrlMachine machine(reused);
+  for (const std::string& first : urls) {
+    for (const std::string& second : urls) {
+      machine.restart();
+      machine.offer(first.data(), first.size());
+      machine.restart();
+      reused.bytes.clear();
+      const std::size_t rejected = machine.offer(second.data(), second.size());
+      html_test::ByteRecorder fresh;
+      utils::DataUrlMachine expected(fresh);
+      EXPECT_EQ(rejected, expected.offer(second.data(), second.size())) << first << " | " << second;
+      EXPECT_EQ(reused.bytes, fresh.bytes) << first << " | " << second;
+      EXPECT_EQ(machine.mediaType(), expected.mediaType()) << first << " | " << second;
+      EXPECT_EQ(machine.rejected(), expected.rejected()) << first << " | " << second;
+      EXPECT_EQ(machine.inHeader(), expected.inHeader()) << first << " | " << second;
+    }
+  }
+  // Starting over takes nothing more from the heap once the first block is there.
+  const std::size_t blocks = machine.arena().heapAllocations();
+  for (int i = 0; i < 1000; ++i) {
+    machine.restart();
+    machine.offer("data:,x", 7);
+  }
+  EXPECT_EQ(machine.arena().heapAllocations(), blocks);
 }
 
 }  // namespace

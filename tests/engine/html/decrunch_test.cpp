@@ -118,6 +118,28 @@ TEST(DecrunchRefresh, DataUrlBehindARefreshIsAPageOfItsOwn) {
                     "begin_nested", "end_nested", "json:0"}));
 }
 
+// One decoder serves every refresh of a page: each target still opens and closes its own
+// nested page, whatever the target before it left behind.
+TEST(DecrunchRefresh, EveryTargetIsANestedPageOfItsOwn) {
+  // Base64 of "<b>1</b><br>"; the second target stops inside an escape, the fourth in the
+  // middle of base64, the fifth in its header.
+  EXPECT_EQ(Decrunched("<meta content='0;url=data:text/html;base64,PGI+MTwvYj48YnI+'>"
+                       "<meta content='0;url=data:,%3Ctitle%3EA%3'>"
+                       "<meta content='0;url=/plain'>"
+                       "<meta content='0;url=data:text/html;base64,PGI+MT'>"
+                       "<meta content='0;url=data:text/html'>"
+                       "<meta content='0;url=data:,%3Ctitle%3EB%3C/title%3E'>"),
+            (Events{"begin_nested", "text:1", "break", "end_nested", "begin_nested", "sink:title",
+                    "end_nested", "begin_nested", "end_nested", "begin_nested", "end_nested",
+                    "begin_nested", "end_nested", "begin_nested", "sink:title", "title.text:B",
+                    "title.end", "end_nested", "json:0"}));
+  // A second content in one meta ends the first target before the second one begins.
+  EXPECT_EQ(Decrunched("<meta content='0;url=data:,%3Cbr%3Ex' content='1;url=data:,y%3Cbr%3E'>"
+                       "<meta content='0;url=/a' content='x'>"),
+            (Events{"begin_nested", "break", "end_nested", "begin_nested", "text:y", "break",
+                    "end_nested", "begin_nested", "end_nested", "json:0"}));
+}
+
 TEST(DecrunchScripts, StringsGoToTheScriptSinkAndUrlsAreReported) {
   EXPECT_EQ(Decrunched("<script src=\"/a%20b.js\">var u = \"http://evil.example/p%3Fx\", n = 2 / 1;"
                        "\n  s = ' \\u0041%41';</script>"),
