@@ -112,12 +112,19 @@ class FastParserMachine
       buffer_.append(b, flush);
       return util::Stay();
     }
+    // Text up to the next '<', then the tag it opens when the chunk holds it whole.
     static constexpr bool kBulk = true;
     const Byte* consume(const Byte* p, const Byte* end) override {
-      const Byte* stop = findByte(p, end, '<');
-      buffer_.appendRun(p, static_cast<std::size_t>(stop - p),
-                        [this](const Char* data, std::size_t n) { this->flush(data, n); });
-      return stop;
+      auto flush = [this](const Char* data, std::size_t n) { this->flush(data, n); };
+      for (;;) {
+        const Byte* stop = findByte(p, end, '<');
+        buffer_.appendRun(p, static_cast<std::size_t>(stop - p), flush);
+        if (stop == end) return stop;
+        const Byte* after =
+            this->machine().wholeTag(stop, end, [this, &flush] { buffer_.flushIfAny(flush); });
+        if (after == nullptr) return stop;
+        p = after;
+      }
     }
     void flush(const Char* data, std::size_t n) override {
       Config::text(this->machine().handler(), data, n);
@@ -629,6 +636,20 @@ class FastParserMachine
     std::size_t matched_ = 0;
   };
 
+  // A tag longer than this (from its '<' to its '>') is left to the states.
+  static constexpr std::size_t kMaxWholeTagBytes = 1024;
+  static_assert(kMaxWholeTagBytes <= kMaxTagNameBytes &&
+                kMaxWholeTagBytes <= kMaxAttributeNameBytes &&
+                kMaxWholeTagBytes <= kMaxAttributeValueBytes);
+  // The tag that starts at `lt` read whole, the text before it flushed first: answers where
+  // its '>' was passed, or nullptr (and nothing done) when the states are to read it. See
+  // tokenizer_whole_tag.h.
+  template <typename FlushText>
+  const Byte* wholeTag(const Byte* lt, const Byte* end, FlushText&& flushText);
+  static const Byte* findStartTagEnd(const Byte* p, const Byte* end);
+  template <bool Reported>
+  void wholeAttributes(const Byte* p, const Byte* close);
+
   // Where an unquoted value ends (collected or skipped), and a streamed one ('/' may make the
   // tag self-closing).
   static constexpr ByteSet kUnquotedEnd{">", /*whitespace=*/true};
@@ -642,3 +663,5 @@ class FastParserMachine
 };
 
 }  // namespace html
+
+#include "engine/html/tokenizer_whole_tag.h"
