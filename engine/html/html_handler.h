@@ -143,6 +143,7 @@ class HtmlHandler final : private ElementTracker::Listener {
   void descriptionByte(std::uint8_t byte);
   void refreshByte(std::uint8_t byte);
   void refreshRun(const char* data, std::size_t length);
+  void refreshTargetBegins(std::uint8_t first);
 
   void clearStrings();
 

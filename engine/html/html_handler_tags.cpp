@@ -114,12 +114,8 @@ void HtmlHandler::descriptionByte(std::uint8_t byte) {
 void HtmlHandler::refreshByte(std::uint8_t byte) {
   switch (refresh_.feed(byte)) {
     case RefreshParser::Step::kFirstUrl:
-      if (depth_ < html::kMaxDecrunchNesting) {
-        // One decoder serves every refresh of the page.
-        if (metaUrl_ == nullptr) metaUrl_ = std::make_unique<DecrunchMetaUrl>(receiver_, depth_);
-        metaUrl_->start();
-      }
-      [[fallthrough]];
+      refreshTargetBegins(byte);
+      break;
     case RefreshParser::Step::kUrl:
       if (metaUrl_ != nullptr && metaUrl_->open()) metaUrl_->feed(byte);
       break;
@@ -128,8 +124,17 @@ void HtmlHandler::refreshByte(std::uint8_t byte) {
   }
 }
 
-// A refresh value in runs: once the parser has reached the target (or given up) the rest of
-// the run goes on as a whole.
+void HtmlHandler::refreshTargetBegins(std::uint8_t first) {
+  if (depth_ < html::kMaxDecrunchNesting) {
+    // One decoder serves every refresh of the page.
+    if (metaUrl_ == nullptr) metaUrl_ = std::make_unique<DecrunchMetaUrl>(receiver_, depth_);
+    metaUrl_->start();
+  }
+  if (metaUrl_ != nullptr && metaUrl_->open()) metaUrl_->feed(first);
+}
+
+// A refresh value in runs: the parser reads up to the target; once it has reached the target
+// (or given up) the rest of the run goes on as a whole.
 void HtmlHandler::refreshRun(const char* data, std::size_t length) {
   while (length > 0) {
     if (refresh_.inTarget()) {
@@ -140,8 +145,10 @@ void HtmlHandler::refreshRun(const char* data, std::size_t length) {
       refresh_.addFallback(data, length);
       return;
     }
-    refreshByte(static_cast<std::uint8_t>(*data++));
-    --length;
+    const std::size_t taken = refresh_.feedUpToTarget(data, length);
+    data += taken;
+    length -= taken;
+    if (refresh_.inTarget()) refreshTargetBegins(static_cast<std::uint8_t>(data[-1]));
   }
 }
 

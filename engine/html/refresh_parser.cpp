@@ -70,6 +70,14 @@ RefreshParser::Step RefreshParser::feed(std::uint8_t b) {
   return Step::kNone;
 }
 
+std::size_t RefreshParser::feedUpToTarget(const char* data, std::size_t length) {
+  std::size_t taken = 0;
+  while (taken < length && state_ != State::kTarget && state_ != State::kGaveUp) {
+    feed(static_cast<std::uint8_t>(data[taken++]));
+  }
+  return taken;
+}
+
 void RefreshParser::addFallback(const char* data, std::size_t length) {
   const std::size_t room = kMaxRefreshTextBytes - std::min(kMaxRefreshTextBytes, fallback_.size());
   fallback_.append(data, std::min(length, room));

@@ -26,6 +26,11 @@ class RefreshParser {
   // text (feed answers kNone).
   bool inTarget() const { return state_ == State::kTarget; }
   bool gaveUp() const { return state_ == State::kGaveUp; }
+  // The same as feed for each byte of a run, up to and including the first byte of the
+  // target: answers how many bytes were taken. The last of them was the target's first when
+  // inTarget() holds afterwards (and was not before). Takes nothing in the target or after
+  // giving up.
+  std::size_t feedUpToTarget(const char* data, std::size_t length);
   // After giving up: the same as feed for each byte.
   void addFallback(const char* data, std::size_t length);
 

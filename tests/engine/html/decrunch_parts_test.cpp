@@ -2,6 +2,7 @@
 // element tracker's limits and the script string extractor's hand-overs.
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <string>
 #include <vector>
 
@@ -48,6 +49,49 @@ TEST(DecrunchRefreshParser, DelayUrlAndFallback) {
   const std::string blanks(3 * html_decrunch::kMaxRefreshTextBytes, ' ');
   EXPECT_EQ(ReadRefresh(blanks + "x").second.size(), html_decrunch::kMaxRefreshTextBytes);
   EXPECT_EQ(ReadRefresh("x" + blanks).second.size(), html_decrunch::kMaxRefreshTextBytes);
+}
+
+// The same through feedUpToTarget in runs of every length: the run stops right after the
+// target's first byte, and what the parser ends with does not depend on the cuts.
+TEST(DecrunchRefreshParser, RunsUpToTheTargetAsByteByByte) {
+  const std::vector<std::string> contents = {
+      "  10 ;\t URL  = data:x y",
+      "0;url='a'",
+      "5",
+      "width=device",
+      "5;u rl=x",
+      "5 5;url=x",
+      "0; url=",
+      "0;url= \n x",
+      std::string(600, ' ') + "1;url=" + std::string(600, 'z')};
+  for (const std::string& content : contents) {
+    const auto expected = ReadRefresh(content);
+    for (std::size_t cut = 1; cut <= content.size(); ++cut) {
+      RefreshParser parser;
+      parser.reset();
+      std::string target;
+      std::size_t at = 0;
+      while (at < content.size()) {
+        const std::size_t run = std::min(cut, content.size() - at);
+        if (parser.inTarget()) {
+          target.append(content, at, run);
+          at += run;
+          continue;
+        }
+        if (parser.gaveUp()) {
+          parser.addFallback(content.data() + at, run);
+          at += run;
+          continue;
+        }
+        const std::size_t taken = parser.feedUpToTarget(content.data() + at, run);
+        ASSERT_GT(taken, 0u);
+        at += taken;
+        if (parser.inTarget()) target += '|' + content.substr(at - 1, 1);
+      }
+      EXPECT_EQ(target, expected.first) << content << ", runs of " << cut;
+      EXPECT_EQ(parser.fallback(), expected.second) << content << ", runs of " << cut;
+    }
+  }
 }
 
 class ClosedNames : public html_decrunch::ElementTracker::Listener {
