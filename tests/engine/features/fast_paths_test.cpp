@@ -305,3 +305,67 @@ TEST(HTMLFeatures, OwnAndForeignHostsBeyondTheRememberedOnes) {
 }
 
 }  // namespace
+
+namespace {
+
+// A host that does not end in the page's registrable domain is foreign without the suffix
+// list: the answers agree with comparing registrable domains, for hosts that end in the
+// page's domain without being its site (a public suffix below it, a longer label), IP
+// addresses and hosts of other sites.
+TEST(HTMLFeatures, ForeignHostsAgreeWithTheirRegistrableDomains) {
+  const std::vector<std::string> pages = {
+      "https://www.shop.example.co.uk/", "https://example.net/", "https://user.blogspot.com/",
+      "https://blogspot.com/",           "http://10.1.2.3/",     "https://co.uk/"};
+  const std::vector<std::string> hosts = {"shop.example.co.uk",
+                                          "example.co.uk",
+                                          "a.b.shop.example.co.uk",
+                                          "notexample.co.uk",
+                                          "co.uk",
+                                          "example.net",
+                                          "www.example.net",
+                                          "anexample.net",
+                                          "net",
+                                          "blogspot.com",
+                                          "user.blogspot.com",
+                                          "x.user.blogspot.com",
+                                          "otheruser.blogspot.com",
+                                          "10.1.2.3",
+                                          "110.1.2.3",
+                                          "[::1]",
+                                          "xn--bcher-kva.example.net",
+                                          "example.co.uk.evil.org"};
+  auto lexemes = features_test::Lexemes(features_test::kDefaultLexemes);
+  auto world = features_test::DefaultWorld();
+  int foreignSeen = 0, ownSeen = 0;
+  for (const std::string& page : pages) {
+    html_features::UrlParts pageParts;
+    html_features::SplitUrl(page, pageParts);
+    ASSERT_TRUE(pageParts.hasHost) << page;
+    const std::string pageDomain(html_features::RegistrableDomain(pageParts.host));
+    for (const std::string& host : hosts) {
+      html_features::UrlParts parts;
+      html_features::SplitUrl("https://" + host + "/", parts);
+      ASSERT_TRUE(parts.hasHost) << host;
+      const std::string_view domain = html_features::RegistrableDomain(parts.host);
+      ASSERT_TRUE(std::string_view(parts.host).ends_with(domain)) << host;
+      const bool expected = domain != pageDomain;
+      (expected ? foreignSeen : ownSeen)++;
+
+      ap::HTMLFeatures features(page, world, lexemes, nullptr);
+      const std::string html = "<form action=\"https://" + host + "/x\"></form>";
+      html::Decrunch pipeline(features, false);
+      pipeline.feed(html.data(), html.size());
+      std::string target;
+      std::vector<float> vector;
+      features.GetVector(target, vector, pipeline.byteCount());
+      float foreign = 0;
+      for (std::size_t s = 0; s < 3; ++s)
+        foreign += vector.at(html_features::SegmentBin(s, html_features::kEvFormForeign));
+      EXPECT_EQ(foreign, expected ? 1.0f : 0.0f) << page << " " << host;
+    }
+  }
+  EXPECT_GT(ownSeen, 8);
+  EXPECT_GT(foreignSeen, 40);
+}
+
+}  // namespace
