@@ -36,14 +36,30 @@ class UTF8Normalizer {
       // Plain ASCII outside a reference or a sequence, the bulk of most text, is read here:
       // what byte() would do for it, without its tests.
       if (!inReference_ && pending_ == 0) {
-        for (; p != end; ++p) {
-          const std::uint8_t kind = kAscii[*p];
-          if (kind == kWordEnd) {
-            finder_.wordEnd();
-          } else if (kind != kOther) {
-            finder_.feed(kind);
-          } else {
-            break;
+        if constexpr (requires { finder_.feedRun(p, end, kAscii.data()); }) {
+          // A finder that takes whole runs of word bytes (the lexeme word finder) gets them
+          // so; a word end on a finder outside a word does nothing, so it is not called.
+          while (p != end) {
+            const std::uint8_t kind = kAscii[*p];
+            if (kind == kWordEnd) {
+              if (finder_.inWord()) finder_.wordEnd();
+              ++p;
+            } else if (kind != kOther) {
+              p = finder_.feedRun(p, end, kAscii.data());
+            } else {
+              break;
+            }
+          }
+        } else {
+          for (; p != end; ++p) {
+            const std::uint8_t kind = kAscii[*p];
+            if (kind == kWordEnd) {
+              finder_.wordEnd();
+            } else if (kind != kOther) {
+              finder_.feed(kind);
+            } else {
+              break;
+            }
           }
         }
         if (p == end) break;

@@ -16,6 +16,7 @@
 #include "engine/features/url_record.h"
 #include "engine/features/url_splitter.h"
 #include "engine/features/utf8_normalizer.h"
+#include "engine/features/word_finder.h"
 #include "engine/html/decrunch.h"
 #include "engine/kb/case_fold.h"
 #include "tests/support/features_test_support.h"
@@ -149,6 +150,97 @@ TEST(NormalizerFastPath, PlainAsciiIsLowerCasedAndCutAtDelimiters) {
   n.text(text.data(), text.size());
   n.wordEnd();
   EXPECT_EQ(out.out, "hello||world|wide|web|42||");  // every end is passed on
+}
+
+// What a word finder tells its handler, written down in order.
+struct FinderLog {
+  std::string out;
+  void word() { out += "w "; }
+  void lexeme(const lex::LexemeStats& s) {
+    out += "L" + std::to_string(s.first_value) + "/" + std::to_string(s.second_value) + " ";
+  }
+  void phrase(const LexemeDB::Phrase& p, std::uint16_t items) {
+    out += "P" + std::to_string(p.stats.first_value) + "x" + std::to_string(items) + " ";
+  }
+};
+
+// The normaliser hands a lexeme word finder whole runs of ASCII word bytes (feedRun): the
+// finder's handler hears the same words, lexemes and phrases as when every byte goes
+// through the per-byte reader and feed(), whatever the chunking and the block breaks. The
+// text mixes lexemes, their prefixes and extensions, words that leave the trie at once or
+// late, long words, and the hostile pieces of the test above.
+TEST(NormalizerFastPath, FinderRunsAgreeWithFeedingByteByByte) {
+  const LexemeDB db = features_test::Lexemes(std::string(features_test::kDefaultLexemes) +
+                                             "stra\xc3\x9f"
+                                             "e 13 0 0\n"
+                                             "a1 5 0 0\n"
+                                             "x 3 0 0\n");
+  static const std::vector<std::string> kWords = {
+      "verify", "Account", "ACCOUNT", "accoun",  "accounts", "sign", "in",
+      "In",     "PayPal",  "paypa",   "paypall", "password", "pass", "login",
+      "LOGIN",  "a1",      "A",       "a",       "x",        "xx",   "zzzzzzzzzzzzzzzzzzzzzzzz",
+      "qwerty", "secure",  "urgent",  "9"};
+  std::mt19937 rng(4242);
+  for (int round = 0; round < 400; ++round) {
+    std::string text;
+    const std::size_t pieces = 1 + rng() % 150;
+    for (std::size_t i = 0; i < pieces; ++i) {
+      const unsigned pick = rng() % 10;
+      if (pick < 5) {
+        text += kWords[rng() % kWords.size()];
+      } else if (pick < 8) {
+        text += " ,.\n-"[rng() % 5];
+      } else {
+        text += HostileText(rng, 1);
+      }
+    }
+    std::vector<std::size_t> cuts;
+    std::vector<bool> breaks;
+    for (std::size_t i = 0; i < text.size();) {
+      const std::size_t n = std::min<std::size_t>(1 + rng() % 23, text.size() - i);
+      cuts.push_back(n);
+      breaks.push_back(rng() % 6 == 0);
+      i += n;
+    }
+    const auto run = [&](int how) {
+      FinderLog log;
+      lex::WordsFinder<LexemeDB, FinderLog> finder(db, log);
+      lex::UTF8Normalizer<lex::WordsFinder<LexemeDB, FinderLog>> n(finder);
+      if (how == 2) {
+        n.text(text.data(), text.size());
+      } else {
+        std::size_t at = 0;
+        for (std::size_t k = 0; k < cuts.size(); ++k) {
+          if (how == 0) {
+            n.textByteByByte(text.data() + at, cuts[k]);
+          } else {
+            n.text(text.data() + at, cuts[k]);
+          }
+          if (breaks[k]) n.wordEnd();
+          at += cuts[k];
+        }
+      }
+      n.wordEnd();
+      return log.out;
+    };
+    const std::string reference = run(0);
+    ASSERT_EQ(run(1), reference) << "round " << round;
+    // Unbroken, the per-byte reader gives what the whole text does at once.
+    FinderLog log;
+    lex::WordsFinder<LexemeDB, FinderLog> finder(db, log);
+    lex::UTF8Normalizer<lex::WordsFinder<LexemeDB, FinderLog>> n(finder);
+    n.textByteByByte(text.data(), text.size());
+    n.wordEnd();
+    ASSERT_EQ(run(2), log.out) << "round " << round;
+  }
+  // The log is not empty by accident: lexemes and a phrase are heard.
+  FinderLog log;
+  lex::WordsFinder<LexemeDB, FinderLog> finder(db, log);
+  lex::UTF8Normalizer<lex::WordsFinder<LexemeDB, FinderLog>> n(finder);
+  const std::string text = "Please VERIFY your PayPal account, zzzz paypall";
+  n.text(text.data(), text.size());
+  n.wordEnd();
+  EXPECT_EQ(log.out, "w w L0/0 w w L50/101 w L10/0 w w ");
 }
 
 // Words of a few letters from a small alphabet (ASCII and UTF-8 lead and continuation
