@@ -461,3 +461,92 @@ TEST(HTMLFeatures, ForeignHostsAgreeWithTheirRegistrableDomains) {
 }
 
 }  // namespace
+
+namespace {
+
+// The splitter reads a host without '%' in place, lower-cases and checks it in one pass by
+// table, and turns a path's backslashes into slashes by search. Against the plain rules over
+// random web URLs: the host is the authority's host lower-cased (written even when refused,
+// as link records count its length and dots), refused when it holds a forbidden byte; the
+// same host written with percent escapes splits the same; and a backslash is a slash up to
+// the first '?' or '#' of the path, not after.
+TEST(UrlSplitter, HostAndPathFastPathsAgreeWithThePlainRules) {
+  static const std::vector<std::string> kHostPieces = {
+      "a", "B", "z", "Q",    "0",  "7",   "-",    ".", "example", "PayPal", "<",
+      "^", "|", " ", "\x7f", "@x", ":80", "xn--", "%", "%zz",     "]",      "\t"};
+  static const std::vector<std::string> kPathPieces = {"/",   "\\", "a",    "?",    "#",
+                                                       "%5C", "B",  "\\\\", "&q=1", ".."};
+  static const std::vector<std::string> kSchemes = {"http://", "HTTPS://", "hTtP:\\\\", "//",
+                                                    "https:///"};
+  const auto isForbidden = [](unsigned char c) {
+    return c <= 0x20 || c == 0x7F ||
+           std::string_view("#/:<>?@[\\]^|%").find(static_cast<char>(c)) != std::string_view::npos;
+  };
+  std::mt19937 rng(1207);
+  int refused = 0, taken = 0;
+  for (int round = 0; round < 5000; ++round) {
+    std::string host;
+    const std::size_t hostPieces = 1 + rng() % 6;
+    for (std::size_t i = 0; i < hostPieces; ++i) host += kHostPieces[rng() % kHostPieces.size()];
+    host += rng() % 2 ? ".com" : "";
+    std::string path;
+    const std::size_t pathPieces = rng() % 8;
+    for (std::size_t i = 0; i < pathPieces; ++i) path += kPathPieces[rng() % kPathPieces.size()];
+    if (!path.empty() && path[0] != '/' && path[0] != '\\' && path[0] != '?' && path[0] != '#')
+      path.insert(0, "/");
+    const std::string scheme = kSchemes[rng() % kSchemes.size()];
+    html_features::UrlParts parts;
+    html_features::SplitUrl(scheme + host + path, parts);
+
+    // Plain hosts: the authority (no '/', '\', '?', '#', '@' or ':' in it; not ending in a
+    // number, so not read as an address) is the host.
+    const bool plain = host.find_first_of("@:%\t") == std::string::npos &&
+                       host.find("xn--") == std::string::npos &&
+                       host.find_first_of("\\/?#") == std::string::npos && host.back() >= 'A' &&
+                       host.find_first_not_of(" \x7f") == 0 && host.back() != ' ' &&
+                       host.back() != '\x7f' && host.back() != '.';
+    if (plain) {
+      std::string lower;
+      bool forbidden = false;
+      for (const char c : host) {
+        lower.push_back(c >= 'A' && c <= 'Z' ? static_cast<char>(c + 32) : c);
+        forbidden = forbidden || isForbidden(static_cast<unsigned char>(c));
+      }
+      ASSERT_EQ(parts.host, lower) << scheme + host + path;
+      ASSERT_EQ(parts.hasHost, !forbidden) << scheme + host + path;
+      (forbidden ? refused : taken)++;
+    }
+    // Every letter and digit of the host escaped: the same parts.
+    std::string escaped;
+    for (const char c : host) {
+      if ((c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || (c >= '0' && c <= '9')) {
+        char code[4];
+        std::snprintf(code, sizeof code, "%%%02X", static_cast<unsigned char>(c));
+        escaped += code;
+      } else {
+        escaped.push_back(c);
+      }
+    }
+    if (escaped != host && host.find_first_of("%:@") == std::string::npos) {
+      html_features::UrlParts again;
+      html_features::SplitUrl(scheme + escaped + path, again);
+      ASSERT_EQ(again.hasHost, parts.hasHost) << scheme + escaped + path;
+      ASSERT_EQ(again.host, parts.host) << scheme + escaped + path;
+      ASSERT_EQ(again.unicodeHost, parts.unicodeHost) << scheme + escaped + path;
+    }
+    // The path's backslashes, by the plain loop (for hosts that neither end the authority
+    // early nor carry a port, which may refuse the URL before its path is read).
+    if (host.find_first_of("\\/?#:\t") == std::string::npos) {
+      std::string expected = path;
+      for (char& c : expected) {
+        if (c == '?' || c == '#') break;
+        if (c == '\\') c = '/';
+      }
+      ASSERT_EQ(parts.path, expected) << scheme + host + path;
+    }
+  }
+  EXPECT_GT(refused, 200);
+  EXPECT_GT(taken, 200);
+}
+
+}  // namespace
