@@ -38,12 +38,14 @@ class UTF8Normalizer {
       if (!inReference_ && pending_ == 0) {
         if constexpr (requires { finder_.feedRun(p, end, kAscii.data()); }) {
           // A finder that takes whole runs of word bytes (the lexeme word finder) gets them
-          // so; a word end on a finder outside a word does nothing, so it is not called.
+          // so; a word end on a finder outside a word does nothing, so a run of delimiters
+          // (the blanks that indent markup) ends the word once.
           while (p != end) {
             const std::uint8_t kind = kAscii[*p];
             if (kind == kWordEnd) {
               if (finder_.inWord()) finder_.wordEnd();
-              ++p;
+              while (++p != end && kAscii[*p] == kWordEnd) {
+              }
             } else if (kind != kOther) {
               p = finder_.feedRun(p, end, kAscii.data());
             } else {
