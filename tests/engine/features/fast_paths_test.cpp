@@ -550,3 +550,72 @@ TEST(UrlSplitter, HostAndPathFastPathsAgreeWithThePlainRules) {
 }
 
 }  // namespace
+
+namespace {
+
+// Everything of a URL record but its working strings.
+std::string Describe(const html_features::UrlRecord& r) {
+  std::string out = std::to_string(static_cast<int>(r.parts.linkClass)) + r.parts.host + "|" +
+                    r.parts.unicodeHost + "|" + r.parts.path + "|";
+  for (const bool b : {r.parts.relative, r.parts.hasHost, r.trusted, r.white, r.ip, r.hostLexemes,
+                       r.hostKeysKnown})
+    out += b ? '1' : '0';
+  out += "|" + std::to_string(r.key) + "|" + std::to_string(r.category) + "|";
+  for (std::size_t i = 0; i < r.hostKeyCount; ++i) out += std::to_string(r.hostKeys[i]) + ",";
+  for (const float f : r.hostFloats) out += std::to_string(f) + ",";
+  return out;
+}
+
+// The host memo against analysing every URL afresh: random links to listed, unlisted,
+// special and lexeme-bearing hosts (in both cases, as IDN and punycode), with paths under
+// and beside share links, give the same records, and the memo stops growing at its limit.
+TEST(HostMemo, RecordsAgreeWithAnalysingEveryUrlAfresh) {
+  auto lexemes = features_test::Lexemes(features_test::kDefaultLexemes);
+  auto world = features_test::DefaultWorld();
+  world.shareLinks = {
+      {"paypal.com", "/shared/"}, {"www.examplebank.com", "/"}, {"docs.popular.com", "/d"}};
+  static const std::vector<std::string> kHosts = {"paypal.com",
+                                                  "WWW.PayPal.com",
+                                                  "www.examplebank.com",
+                                                  "login.examplemail.com",
+                                                  "paypal.xyz",
+                                                  "docs.popular.com",
+                                                  "secure-login.example",
+                                                  "10.0.0.1",
+                                                  "192.168.1.1",
+                                                  "8.8.8.8",
+                                                  "[::1]",
+                                                  "verify.account.example",
+                                                  "b\xc3\xbc"
+                                                  "cher.example",
+                                                  "xn--bcher-kva.example",
+                                                  "bu\xcc\x88"
+                                                  "cher.example",
+                                                  "unknown.example"};
+  static const std::vector<std::string> kPaths = {"",   "/",    "/shared/",   "/shared/doc",
+                                                  "/d", "/d/e", "/login?x=1", "/a#f"};
+  std::mt19937 rng(31);
+  html_features::HostMemo memo;
+  html_features::UrlRecord withMemo, fresh;
+  int hits = 0;
+  for (int i = 0; i < 3000; ++i) {
+    const std::string url = std::string(rng() % 4 ? "https://" : "//") +
+                            kHosts[rng() % kHosts.size()] + kPaths[rng() % kPaths.size()];
+    const std::size_t before = memo.size();
+    html_features::AnalyseUrl(url, world, lexemes, false, withMemo, &memo);
+    hits += memo.size() == before;
+    html_features::AnalyseUrl(url, world, lexemes, false, fresh);
+    ASSERT_EQ(Describe(withMemo), Describe(fresh)) << url;
+  }
+  EXPECT_GT(hits, 2500);
+  // Past the limit new hosts are still analysed right, and not kept.
+  for (std::size_t i = 0; i < html_features::kMaxRememberedHosts + 50; ++i) {
+    const std::string url = "https://h" + std::to_string(i) + ".paypal.com/x";
+    html_features::AnalyseUrl(url, world, lexemes, false, withMemo, &memo);
+    html_features::AnalyseUrl(url, world, lexemes, false, fresh);
+    ASSERT_EQ(Describe(withMemo), Describe(fresh)) << url;
+  }
+  EXPECT_EQ(memo.size(), html_features::kMaxRememberedHosts);
+}
+
+}  // namespace
