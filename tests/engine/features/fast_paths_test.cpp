@@ -189,7 +189,17 @@ TEST(NormalizerFastPath, FinderRunsAgreeWithFeedingByteByByte) {
       if (pick < 5) {
         text += kWords[rng() % kWords.size()];
       } else if (pick < 8) {
-        text += " ,.\n-"[rng() % 5];
+        static const std::vector<std::string> kGaps = {" ",
+                                                       ",",
+                                                       ".",
+                                                       "\n",
+                                                       "-",
+                                                       "\n        ",
+                                                       "\t\t\t\t\t\t\t\t\t",
+                                                       "  \r\n  ",
+                                                       std::string(17, ' '),
+                                                       std::string("\x01\x1f\x20\x00 ", 5)};
+        text += kGaps[rng() % kGaps.size()];
       } else {
         text += HostileText(rng, 1);
       }
