@@ -81,6 +81,10 @@ bool HTMLFeatures::Impl::foreign(const UrlRecord& r) const {
   if (mail_ || !page_.parts.hasHost) return true;
   if (page_.key != 0 && r.key == page_.key) return false;
   const std::string& host = r.parts.host;
+  // The registrable domain of a host is a tail of the host (or the host itself), so a host
+  // that does not end in the page's registrable domain is another site without asking the
+  // suffix list.
+  if (!std::string_view(host).ends_with(pageRegistrable_)) return true;
   if (const auto known = foreignHosts_.find(host); known != foreignHosts_.end())
     return known->second;
   const bool answer = RegistrableDomain(host) != pageRegistrable_;

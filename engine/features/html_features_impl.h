@@ -78,7 +78,7 @@ class HTMLFeatures::Impl {
     return r.key != 0 && r.category != kNoOrgCategory;
   }
   void analyse(std::string_view url, bool hostFloats = false) {
-    html_features::AnalyseUrl(url, lookup_, lexemes_, hostFloats, scratch_);
+    html_features::AnalyseUrl(url, lookup_, lexemes_, hostFloats, scratch_, &hosts_);
   }
 
   void vector(std::string& target, std::vector<float>& out, std::uint32_t bytes) const;
@@ -118,6 +118,8 @@ class HTMLFeatures::Impl {
   bool inAnchor_ = false;
   std::array<float, html_features::kUrlRecordSize> anchorFive_{};
   html_features::UrlRecord scratch_;
+  // The look-ups and lexemes of the hosts this page's URLs named.
+  html_features::HostMemo hosts_;
 };
 
 }  // namespace ap

@@ -169,7 +169,7 @@ bool TextLexemes(std::string_view text, const LexemeDB& lexemes, std::uint32_t* 
 }
 
 void AnalyseUrl(std::string_view url, ap::WhiteDomainI& lookup, const LexemeDB& lexemes,
-                bool hostFloats, UrlRecord& r) {
+                bool hostFloats, UrlRecord& r, HostMemo* memo) {
   SplitUrl(url, r.parts);
   r.trusted = r.white = r.ip = r.hostLexemes = r.hostKeysKnown = false;
   r.hostKeyCount = 0;
@@ -179,6 +179,20 @@ void AnalyseUrl(std::string_view url, ap::WhiteDomainI& lookup, const LexemeDB& 
   if (!r.parts.hasHost) return;
   const std::string& host = r.parts.host;
   const std::string& path = r.parts.path;
+  if (memo != nullptr && !hostFloats) {
+    if (const HostMemo::Facts* known = memo->find(host, r.parts.unicodeHost)) {
+      r.key = known->key;
+      r.category = known->category;
+      r.white = known->whiteDomain && !IsShareLinkBelow(lookup, host, path);
+      r.ip = known->ip;
+      r.trusted = r.white || known->special;
+      r.hostLexemes = known->hostLexemes;
+      r.hostKeys = known->hostKeys;
+      r.hostKeyCount = known->hostKeyCount;
+      r.hostKeysKnown = true;
+      return;
+    }
+  }
   const ap::WhiteDomainRecord record = lookup.Lookup(host.data(), host.data() + host.size());
   r.key = record.key;
   if (r.key != 0) {
@@ -187,9 +201,11 @@ void AnalyseUrl(std::string_view url, ap::WhiteDomainI& lookup, const LexemeDB& 
     r.category = org.category;
   }
   // Content anyone can publish on a white organisation's domain is judged like any page.
-  r.white = ap::IsWhite(record) && !IsShareLinkBelow(lookup, host, path);
+  const bool whiteDomain = ap::IsWhite(record);
+  r.white = whiteDomain && !IsShareLinkBelow(lookup, host, path);
   r.ip = IsDottedIPv4(host);
-  r.trusted = r.white || IsSpecialAddress(host);
+  const bool special = IsSpecialAddress(host);
+  r.trusted = r.white || special;
   if (hostFloats && !r.trusted) {
     HostChannels(r.parts.unicodeHost, lexemes, r);
   } else {
@@ -197,6 +213,10 @@ void AnalyseUrl(std::string_view url, ap::WhiteDomainI& lookup, const LexemeDB& 
     r.hostLexemes = TextLexemes(r.parts.unicodeHost, lexemes, r.hostKeys.data(), r.hostKeys.size(),
                                 r.hostKeyCount);
     r.hostKeysKnown = true;
+    if (memo != nullptr && !hostFloats) {
+      memo->keep(host, HostMemo::Facts{r.parts.unicodeHost, r.key, r.category, whiteDomain, r.ip,
+                                       special, r.hostLexemes, r.hostKeys, r.hostKeyCount});
+    }
   }
 }
 

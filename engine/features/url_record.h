@@ -6,6 +6,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <string>
+#include <unordered_map>
 
 #include "engine/features/feature_layout.h"
 #include "engine/features/url_splitter.h"
@@ -43,9 +44,46 @@ struct UrlRecord {
 
 using LexemeDB = lex::WordsDB<char, lex::LexemeStats>;
 
+// Hosts a HostMemo keeps; past this many, a new host is analysed every time it comes.
+inline constexpr std::size_t kMaxRememberedHosts = 1024;
+
+// What AnalyseUrl learns from a URL's host alone, kept by host so that a page's links to
+// one host look it up once: the organisation and its category, whether its domain is
+// white (before share links, which depend on the path), whether it is an IP address or a
+// special one, and its lexemes with the organisations they name.
+class HostMemo {
+ public:
+  struct Facts {
+    std::string unicodeHost;  // the Unicode form these lexemes were found in
+    std::uint32_t key = 0;
+    std::int32_t category = 6;
+    bool whiteDomain = false;
+    bool ip = false;
+    bool special = false;
+    bool hostLexemes = false;
+    std::array<std::uint32_t, UrlRecord::kMaxHostLexemeKeys> hostKeys{};
+    std::size_t hostKeyCount = 0;
+  };
+  // The facts kept for `host` in the Unicode form `unicodeHost`, or null.
+  const Facts* find(const std::string& host, const std::string& unicodeHost) const {
+    const auto it = byHost_.find(host);
+    return it != byHost_.end() && it->second.unicodeHost == unicodeHost ? &it->second : nullptr;
+  }
+  // Keeps `facts` for `host` while fewer than kMaxRememberedHosts are kept.
+  void keep(const std::string& host, const Facts& facts) {
+    if (byHost_.size() < kMaxRememberedHosts) byHost_.insert_or_assign(host, facts);
+  }
+  std::size_t size() const { return byHost_.size(); }
+
+ private:
+  std::unordered_map<std::string, Facts> byHost_;
+};
+
 // Analyses `url` into `record`. With `hostFloats` the three host channels are computed.
+// Without them, `memo` (if given) answers for hosts analysed before and keeps new ones:
+// the record is the same either way.
 void AnalyseUrl(std::string_view url, ap::WhiteDomainI& lookup, const LexemeDB& lexemes,
-                bool hostFloats, UrlRecord& record);
+                bool hostFloats, UrlRecord& record, HostMemo* memo = nullptr);
 
 // Whether `text` (a host or a path) has any lexeme, and the organisations its lexemes name
 // (at most kMaxKeys of them, written to keys, count returned through keyCount).

@@ -15,7 +15,7 @@
 namespace html_features {
 namespace {
 
-bool IsAsciiAlpha(char c) { return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z'); }
+constexpr bool IsAsciiAlpha(char c) { return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z'); }
 bool IsAsciiDigit(char c) { return c >= '0' && c <= '9'; }
 char LowerAscii(char c) { return c >= 'A' && c <= 'Z' ? static_cast<char>(c + 32) : c; }
 bool IsSlash(char c) { return c == '/' || c == '\\'; }
@@ -41,17 +41,17 @@ std::string_view Clean(std::string_view url, std::string& buffer) {
   return buffer;
 }
 
-// http or https, in any case.
+// http or https, in any case. Only 'H' and 'h' give 'h' with the 0x20 bit set, and so on
+// for the other letters.
 bool IsWebScheme(std::string_view scheme) {
   if (scheme.size() != 4 && scheme.size() != 5) return false;
-  char lower[5];
-  for (std::size_t i = 0; i < scheme.size(); ++i) lower[i] = LowerAscii(scheme[i]);
-  const std::string_view name(lower, scheme.size());
-  return name == "http" || name == "https";
+  const auto lower = [scheme](std::size_t i) { return static_cast<char>(scheme[i] | 0x20); };
+  return lower(0) == 'h' && lower(1) == 't' && lower(2) == 't' && lower(3) == 'p' &&
+         (scheme.size() == 4 || lower(4) == 's');
 }
 
 // Browsers refuse a host that holds any of these once percent-decoded.
-bool IsForbiddenHostByte(unsigned char c) {
+constexpr bool IsForbiddenHostByte(unsigned char c) {
   if (c <= 0x20 || c == 0x7F) return true;
   switch (c) {
     case '#':
@@ -72,6 +72,27 @@ bool IsForbiddenHostByte(unsigned char c) {
       return false;
   }
 }
+
+// Per byte of an ASCII host: the byte lower-cased, and whether browsers refuse it.
+struct HostByteTables {
+  std::array<char, 256> lower{};
+  std::array<bool, 256> forbidden{};
+};
+constexpr HostByteTables kHostBytes = [] {
+  HostByteTables t;
+  for (unsigned c = 0; c < 256; ++c) {
+    t.lower[c] = static_cast<char>(c >= 'A' && c <= 'Z' ? c + 32 : c);
+    t.forbidden[c] = IsForbiddenHostByte(static_cast<unsigned char>(c));
+  }
+  return t;
+}();
+
+// The bytes that end a URL's authority: '/', '\\', '?' and '#'.
+constexpr std::array<bool, 256> kEndsAuthority = [] {
+  std::array<bool, 256> t{};
+  t['/'] = t['\\'] = t['?'] = t['#'] = true;
+  return t;
+}();
 
 bool PercentDecode(std::string_view in, std::string& out) {
   out.clear();
@@ -190,8 +211,24 @@ struct IdnFree {
 // The ASCII form of a host (lower case; IDN labels as punycode) and its Unicode form.
 bool ToAsciiHost(std::string_view decoded, std::string& ascii, std::string& unicode) {
   bool nonAscii = false;
-  for (char c : decoded) nonAscii = nonAscii || static_cast<unsigned char>(c) >= 0x80;
-  if (nonAscii) {
+  for (char c : decoded) {
+    if (static_cast<unsigned char>(c) >= 0x80) {
+      nonAscii = true;
+      break;
+    }
+  }
+  if (!nonAscii) {
+    // Lower-cased and checked in one pass; the host is written whole even when refused
+    // (the extractor counts its length and dots either way).
+    ascii.resize(decoded.size());
+    bool forbidden = false;
+    for (std::size_t i = 0; i < decoded.size(); ++i) {
+      const auto c = static_cast<unsigned char>(decoded[i]);
+      ascii[i] = kHostBytes.lower[c];
+      forbidden |= kHostBytes.forbidden[c];
+    }
+    if (forbidden) return false;
+  } else {
     const std::string input(decoded);
     char* converted = nullptr;
     if (idn2_lookup_u8(reinterpret_cast<const std::uint8_t*>(input.c_str()),
@@ -201,12 +238,9 @@ bool ToAsciiHost(std::string_view decoded, std::string& ascii, std::string& unic
     }
     const std::unique_ptr<char, IdnFree> owned(converted);
     ascii = converted;
-  } else {
-    ascii.assign(decoded);
-    for (char& c : ascii) c = LowerAscii(c);
+    for (char c : ascii)
+      if (IsForbiddenHostByte(static_cast<unsigned char>(c))) return false;
   }
-  for (char c : ascii)
-    if (IsForbiddenHostByte(static_cast<unsigned char>(c))) return false;
   unicode = ascii;
   if (!nonAscii && ascii.find("xn--") != std::string::npos) {
     // A punycode label must decode, and encode back to itself, as browsers require.
@@ -280,7 +314,7 @@ void SplitUrl(std::string_view url, UrlParts& parts) {
   while (pos < s.size() && IsSlash(s[pos])) ++pos;
 
   std::size_t end = pos;
-  while (end < s.size() && s[end] != '/' && s[end] != '\\' && s[end] != '?' && s[end] != '#') ++end;
+  while (end < s.size() && !kEndsAuthority[static_cast<unsigned char>(s[end])]) ++end;
   std::string_view authority(s.data() + pos, end - pos);
   const std::size_t at = authority.rfind('@');
   if (at != std::string_view::npos) authority.remove_prefix(at + 1);
@@ -308,11 +342,14 @@ void SplitUrl(std::string_view url, UrlParts& parts) {
     if (value > 65535) return;
   }
 
+  // Backslashes before the query and the fragment read as slashes.
   parts.path.assign(s.substr(end));
-  for (char& c : parts.path) {
-    if (c == '?' || c == '#') break;
-    if (c == '\\') c = '/';
-  }
+  char* const path = parts.path.data();
+  std::size_t stop = parts.path.size();
+  if (const void* q = std::memchr(path, '?', stop)) stop = static_cast<const char*>(q) - path;
+  if (const void* f = std::memchr(path, '#', stop)) stop = static_cast<const char*>(f) - path;
+  for (char* b = path; (b = static_cast<char*>(std::memchr(b, '\\', stop - (b - path))));)
+    *b++ = '/';
 
   if (host.empty() || host.size() > kMaxHostBytes) return;
   if (host[0] == '[') {
@@ -321,8 +358,12 @@ void SplitUrl(std::string_view url, UrlParts& parts) {
     parts.hasHost = true;
     return;
   }
-  std::string& decoded = parts.decoded;
-  PercentDecode(host, decoded);
+  // A host without '%' is its own decoding (the usual case): read in place.
+  std::string_view decoded = host;
+  if (std::memchr(host.data(), '%', host.size()) != nullptr) {
+    PercentDecode(host, parts.decoded);
+    decoded = parts.decoded;
+  }
   if (!ToAsciiHost(decoded, parts.host, parts.unicodeHost)) return;
   if (EndsInNumber(parts.host)) {
     if (!ParseIPv4(parts.host, parts.host)) return;

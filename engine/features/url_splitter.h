@@ -44,7 +44,8 @@ bool IsDottedIPv4(std::string_view host);
 bool IsSpecialAddress(std::string_view host);
 
 // The registrable domain of an ASCII host by the Public Suffix List (libpsl's built-in
-// list); the host itself for an IP address or when the list has no answer.
+// list); the host itself for an IP address or when the list has no answer. Always a tail of
+// `host` (a view into it), which lets callers rule a host out by its ending alone.
 std::string_view RegistrableDomain(const std::string& host);
 // Whether `label` (lower case, ASCII) is a top-level domain of the Public Suffix List.
 bool IsTopLevelDomain(std::string_view label);

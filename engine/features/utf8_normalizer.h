@@ -36,14 +36,42 @@ class UTF8Normalizer {
       // Plain ASCII outside a reference or a sequence, the bulk of most text, is read here:
       // what byte() would do for it, without its tests.
       if (!inReference_ && pending_ == 0) {
-        for (; p != end; ++p) {
-          const std::uint8_t kind = kAscii[*p];
-          if (kind == kWordEnd) {
-            finder_.wordEnd();
-          } else if (kind != kOther) {
-            finder_.feed(kind);
-          } else {
-            break;
+        if constexpr (requires { finder_.feedRun(p, end, kAscii.data()); }) {
+          // A finder that takes whole runs of word bytes (the lexeme word finder) gets them
+          // so; a word end on a finder outside a word does nothing, so a run of delimiters
+          // (the blanks that indent markup) ends the word once.
+          while (p != end) {
+            const std::uint8_t kind = kAscii[*p];
+            if (kind == kWordEnd) {
+              if (finder_.inWord()) finder_.wordEnd();
+              ++p;
+              if constexpr (kBlanksEndWords) {
+                // Eight bytes at a time while all are controls or blanks (at most 0x20):
+                // adding 0x5F sets no byte's top bit exactly then.
+                constexpr std::uint64_t kAdd = 0x5F5F5F5F5F5F5F5Full;
+                constexpr std::uint64_t kTops = 0x8080808080808080ull;
+                std::uint64_t eight;
+                while (end - p >= 8 &&
+                       (std::memcpy(&eight, p, 8), ((eight + kAdd) | eight) & kTops) == 0)
+                  p += 8;
+              }
+              while (p != end && kAscii[*p] == kWordEnd) ++p;
+            } else if (kind != kOther) {
+              p = finder_.feedRun(p, end, kAscii.data());
+            } else {
+              break;
+            }
+          }
+        } else {
+          for (; p != end; ++p) {
+            const std::uint8_t kind = kAscii[*p];
+            if (kind == kWordEnd) {
+              finder_.wordEnd();
+            } else if (kind != kOther) {
+              finder_.feed(kind);
+            } else {
+              break;
+            }
           }
         }
         if (p == end) break;
@@ -187,6 +215,13 @@ class UTF8Normalizer {
       }
     }
     return table;
+  }();
+
+  // Whether every byte up to 0x20 ends a word, as with the default delimiters.
+  static constexpr bool kBlanksEndWords = [] {
+    for (unsigned c = 0; c <= 0x20; ++c)
+      if (kAscii[c] != kWordEnd) return false;
+    return true;
   }();
 
   Finder& finder_;

@@ -38,6 +38,31 @@ class WordsFinder {
     if (cursor_ != DB::Trie::kNoNode) cursor_ = db_.trie().Child(cursor_, static_cast<char>(c));
   }
 
+  // Feeds the run of word bytes that starts at `p` (at least one) and returns where it
+  // stops: at `end` or at the first byte that `table` maps to 0 or 0xFF, the normaliser's
+  // word end and per-byte marks; other entries are the bytes to feed. The same as feed() on
+  // each byte of the run, with the cursor in a register and, once the word has left the
+  // trie, nothing left to do for the rest of the run but to find its end.
+  const unsigned char* feedRun(const unsigned char* p, const unsigned char* end,
+                               const std::uint8_t* table) {
+    if (!inWord_) {
+      inWord_ = true;
+      cursor_ = DB::Trie::kRoot;
+    }
+    NodeId node = cursor_;
+    const auto& trie = db_.trie();
+    while (node != DB::Trie::kNoNode) {
+      node = trie.Child(node, static_cast<char>(table[*p]));
+      if (++p == end || !IsWordMark(table[*p])) {
+        cursor_ = node;
+        return p;
+      }
+    }
+    cursor_ = node;
+    while (p != end && IsWordMark(table[*p])) ++p;
+    return p;
+  }
+
   void wordEnd() {
     if (!inWord_) return;
     inWord_ = false;
@@ -66,6 +91,8 @@ class WordsFinder {
   bool inWord() const { return inWord_; }
 
  private:
+  static bool IsWordMark(std::uint8_t mark) { return static_cast<std::uint8_t>(mark - 1) < 0xFE; }
+
   struct Candidate {
     const Phrase* phrase;
     std::uint32_t item;    // the item it waits for

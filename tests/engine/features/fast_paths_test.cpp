@@ -16,6 +16,7 @@
 #include "engine/features/url_record.h"
 #include "engine/features/url_splitter.h"
 #include "engine/features/utf8_normalizer.h"
+#include "engine/features/word_finder.h"
 #include "engine/html/decrunch.h"
 #include "engine/kb/case_fold.h"
 #include "tests/support/features_test_support.h"
@@ -149,6 +150,107 @@ TEST(NormalizerFastPath, PlainAsciiIsLowerCasedAndCutAtDelimiters) {
   n.text(text.data(), text.size());
   n.wordEnd();
   EXPECT_EQ(out.out, "hello||world|wide|web|42||");  // every end is passed on
+}
+
+// What a word finder tells its handler, written down in order.
+struct FinderLog {
+  std::string out;
+  void word() { out += "w "; }
+  void lexeme(const lex::LexemeStats& s) {
+    out += "L" + std::to_string(s.first_value) + "/" + std::to_string(s.second_value) + " ";
+  }
+  void phrase(const LexemeDB::Phrase& p, std::uint16_t items) {
+    out += "P" + std::to_string(p.stats.first_value) + "x" + std::to_string(items) + " ";
+  }
+};
+
+// The normaliser hands a lexeme word finder whole runs of ASCII word bytes (feedRun): the
+// finder's handler hears the same words, lexemes and phrases as when every byte goes
+// through the per-byte reader and feed(), whatever the chunking and the block breaks. The
+// text mixes lexemes, their prefixes and extensions, words that leave the trie at once or
+// late, long words, and the hostile pieces of the test above.
+TEST(NormalizerFastPath, FinderRunsAgreeWithFeedingByteByByte) {
+  const LexemeDB db = features_test::Lexemes(std::string(features_test::kDefaultLexemes) +
+                                             "stra\xc3\x9f"
+                                             "e 13 0 0\n"
+                                             "a1 5 0 0\n"
+                                             "x 3 0 0\n");
+  static const std::vector<std::string> kWords = {
+      "verify", "Account", "ACCOUNT", "accoun",  "accounts", "sign", "in",
+      "In",     "PayPal",  "paypa",   "paypall", "password", "pass", "login",
+      "LOGIN",  "a1",      "A",       "a",       "x",        "xx",   "zzzzzzzzzzzzzzzzzzzzzzzz",
+      "qwerty", "secure",  "urgent",  "9"};
+  std::mt19937 rng(4242);
+  for (int round = 0; round < 400; ++round) {
+    std::string text;
+    const std::size_t pieces = 1 + rng() % 150;
+    for (std::size_t i = 0; i < pieces; ++i) {
+      const unsigned pick = rng() % 10;
+      if (pick < 5) {
+        text += kWords[rng() % kWords.size()];
+      } else if (pick < 8) {
+        static const std::vector<std::string> kGaps = {" ",
+                                                       ",",
+                                                       ".",
+                                                       "\n",
+                                                       "-",
+                                                       "\n        ",
+                                                       "\t\t\t\t\t\t\t\t\t",
+                                                       "  \r\n  ",
+                                                       std::string(17, ' '),
+                                                       std::string("\x01\x1f\x20\x00 ", 5)};
+        text += kGaps[rng() % kGaps.size()];
+      } else {
+        text += HostileText(rng, 1);
+      }
+    }
+    std::vector<std::size_t> cuts;
+    std::vector<bool> breaks;
+    for (std::size_t i = 0; i < text.size();) {
+      const std::size_t n = std::min<std::size_t>(1 + rng() % 23, text.size() - i);
+      cuts.push_back(n);
+      breaks.push_back(rng() % 6 == 0);
+      i += n;
+    }
+    const auto run = [&](int how) {
+      FinderLog log;
+      lex::WordsFinder<LexemeDB, FinderLog> finder(db, log);
+      lex::UTF8Normalizer<lex::WordsFinder<LexemeDB, FinderLog>> n(finder);
+      if (how == 2) {
+        n.text(text.data(), text.size());
+      } else {
+        std::size_t at = 0;
+        for (std::size_t k = 0; k < cuts.size(); ++k) {
+          if (how == 0) {
+            n.textByteByByte(text.data() + at, cuts[k]);
+          } else {
+            n.text(text.data() + at, cuts[k]);
+          }
+          if (breaks[k]) n.wordEnd();
+          at += cuts[k];
+        }
+      }
+      n.wordEnd();
+      return log.out;
+    };
+    const std::string reference = run(0);
+    ASSERT_EQ(run(1), reference) << "round " << round;
+    // Unbroken, the per-byte reader gives what the whole text does at once.
+    FinderLog log;
+    lex::WordsFinder<LexemeDB, FinderLog> finder(db, log);
+    lex::UTF8Normalizer<lex::WordsFinder<LexemeDB, FinderLog>> n(finder);
+    n.textByteByByte(text.data(), text.size());
+    n.wordEnd();
+    ASSERT_EQ(run(2), log.out) << "round " << round;
+  }
+  // The log is not empty by accident: lexemes and a phrase are heard.
+  FinderLog log;
+  lex::WordsFinder<LexemeDB, FinderLog> finder(db, log);
+  lex::UTF8Normalizer<lex::WordsFinder<LexemeDB, FinderLog>> n(finder);
+  const std::string text = "Please VERIFY your PayPal account, zzzz paypall";
+  n.text(text.data(), text.size());
+  n.wordEnd();
+  EXPECT_EQ(log.out, "w w L0/0 w w L50/101 w L10/0 w w ");
 }
 
 // Words of a few letters from a small alphabet (ASCII and UTF-8 lead and continuation
@@ -302,6 +404,228 @@ TEST(HTMLFeatures, OwnAndForeignHostsBeyondTheRememberedOnes) {
   for (std::size_t s = 0; s < 3; ++s)
     foreign += vector.at(html_features::SegmentBin(s, html_features::kEvFormForeign));
   EXPECT_EQ(foreign, 2.0f * hosts);
+}
+
+}  // namespace
+
+namespace {
+
+// A host that does not end in the page's registrable domain is foreign without the suffix
+// list: the answers agree with comparing registrable domains, for hosts that end in the
+// page's domain without being its site (a public suffix below it, a longer label), IP
+// addresses and hosts of other sites.
+TEST(HTMLFeatures, ForeignHostsAgreeWithTheirRegistrableDomains) {
+  const std::vector<std::string> pages = {
+      "https://www.shop.example.co.uk/", "https://example.net/", "https://user.blogspot.com/",
+      "https://blogspot.com/",           "http://10.1.2.3/",     "https://co.uk/"};
+  const std::vector<std::string> hosts = {"shop.example.co.uk",
+                                          "example.co.uk",
+                                          "a.b.shop.example.co.uk",
+                                          "notexample.co.uk",
+                                          "co.uk",
+                                          "example.net",
+                                          "www.example.net",
+                                          "anexample.net",
+                                          "net",
+                                          "blogspot.com",
+                                          "user.blogspot.com",
+                                          "x.user.blogspot.com",
+                                          "otheruser.blogspot.com",
+                                          "10.1.2.3",
+                                          "110.1.2.3",
+                                          "[::1]",
+                                          "xn--bcher-kva.example.net",
+                                          "example.co.uk.evil.org"};
+  auto lexemes = features_test::Lexemes(features_test::kDefaultLexemes);
+  auto world = features_test::DefaultWorld();
+  int foreignSeen = 0, ownSeen = 0;
+  for (const std::string& page : pages) {
+    html_features::UrlParts pageParts;
+    html_features::SplitUrl(page, pageParts);
+    ASSERT_TRUE(pageParts.hasHost) << page;
+    const std::string pageDomain(html_features::RegistrableDomain(pageParts.host));
+    for (const std::string& host : hosts) {
+      html_features::UrlParts parts;
+      html_features::SplitUrl("https://" + host + "/", parts);
+      ASSERT_TRUE(parts.hasHost) << host;
+      const std::string_view domain = html_features::RegistrableDomain(parts.host);
+      ASSERT_TRUE(std::string_view(parts.host).ends_with(domain)) << host;
+      const bool expected = domain != pageDomain;
+      (expected ? foreignSeen : ownSeen)++;
+
+      ap::HTMLFeatures features(page, world, lexemes, nullptr);
+      const std::string html = "<form action=\"https://" + host + "/x\"></form>";
+      html::Decrunch pipeline(features, false);
+      pipeline.feed(html.data(), html.size());
+      std::string target;
+      std::vector<float> vector;
+      features.GetVector(target, vector, pipeline.byteCount());
+      float foreign = 0;
+      for (std::size_t s = 0; s < 3; ++s)
+        foreign += vector.at(html_features::SegmentBin(s, html_features::kEvFormForeign));
+      EXPECT_EQ(foreign, expected ? 1.0f : 0.0f) << page << " " << host;
+    }
+  }
+  EXPECT_GT(ownSeen, 8);
+  EXPECT_GT(foreignSeen, 40);
+}
+
+}  // namespace
+
+namespace {
+
+// The splitter reads a host without '%' in place, lower-cases and checks it in one pass by
+// table, and turns a path's backslashes into slashes by search. Against the plain rules over
+// random web URLs: the host is the authority's host lower-cased (written even when refused,
+// as link records count its length and dots), refused when it holds a forbidden byte; the
+// same host written with percent escapes splits the same; and a backslash is a slash up to
+// the first '?' or '#' of the path, not after.
+TEST(UrlSplitter, HostAndPathFastPathsAgreeWithThePlainRules) {
+  static const std::vector<std::string> kHostPieces = {
+      "a", "B", "z", "Q",    "0",  "7",   "-",    ".", "example", "PayPal", "<",
+      "^", "|", " ", "\x7f", "@x", ":80", "xn--", "%", "%zz",     "]",      "\t"};
+  static const std::vector<std::string> kPathPieces = {"/",   "\\", "a",    "?",    "#",
+                                                       "%5C", "B",  "\\\\", "&q=1", ".."};
+  static const std::vector<std::string> kSchemes = {"http://", "HTTPS://", "hTtP:\\\\", "//",
+                                                    "https:///"};
+  const auto isForbidden = [](unsigned char c) {
+    return c <= 0x20 || c == 0x7F ||
+           std::string_view("#/:<>?@[\\]^|%").find(static_cast<char>(c)) != std::string_view::npos;
+  };
+  std::mt19937 rng(1207);
+  int refused = 0, taken = 0;
+  for (int round = 0; round < 5000; ++round) {
+    std::string host;
+    const std::size_t hostPieces = 1 + rng() % 6;
+    for (std::size_t i = 0; i < hostPieces; ++i) host += kHostPieces[rng() % kHostPieces.size()];
+    host += rng() % 2 ? ".com" : "";
+    std::string path;
+    const std::size_t pathPieces = rng() % 8;
+    for (std::size_t i = 0; i < pathPieces; ++i) path += kPathPieces[rng() % kPathPieces.size()];
+    if (!path.empty() && path[0] != '/' && path[0] != '\\' && path[0] != '?' && path[0] != '#')
+      path.insert(0, "/");
+    const std::string scheme = kSchemes[rng() % kSchemes.size()];
+    html_features::UrlParts parts;
+    html_features::SplitUrl(scheme + host + path, parts);
+
+    // Plain hosts: the authority (no '/', '\', '?', '#', '@' or ':' in it; not ending in a
+    // number, so not read as an address) is the host.
+    const bool plain = host.find_first_of("@:%\t") == std::string::npos &&
+                       host.find("xn--") == std::string::npos &&
+                       host.find_first_of("\\/?#") == std::string::npos && host.back() >= 'A' &&
+                       host.find_first_not_of(" \x7f") == 0 && host.back() != ' ' &&
+                       host.back() != '\x7f' && host.back() != '.';
+    if (plain) {
+      std::string lower;
+      bool forbidden = false;
+      for (const char c : host) {
+        lower.push_back(c >= 'A' && c <= 'Z' ? static_cast<char>(c + 32) : c);
+        forbidden = forbidden || isForbidden(static_cast<unsigned char>(c));
+      }
+      ASSERT_EQ(parts.host, lower) << scheme + host + path;
+      ASSERT_EQ(parts.hasHost, !forbidden) << scheme + host + path;
+      (forbidden ? refused : taken)++;
+    }
+    // Every letter and digit of the host escaped: the same parts.
+    std::string escaped;
+    for (const char c : host) {
+      if ((c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || (c >= '0' && c <= '9')) {
+        char code[4];
+        std::snprintf(code, sizeof code, "%%%02X", static_cast<unsigned char>(c));
+        escaped += code;
+      } else {
+        escaped.push_back(c);
+      }
+    }
+    if (escaped != host && host.find_first_of("%:@") == std::string::npos) {
+      html_features::UrlParts again;
+      html_features::SplitUrl(scheme + escaped + path, again);
+      ASSERT_EQ(again.hasHost, parts.hasHost) << scheme + escaped + path;
+      ASSERT_EQ(again.host, parts.host) << scheme + escaped + path;
+      ASSERT_EQ(again.unicodeHost, parts.unicodeHost) << scheme + escaped + path;
+    }
+    // The path's backslashes, by the plain loop (for hosts that neither end the authority
+    // early nor carry a port, which may refuse the URL before its path is read).
+    if (host.find_first_of("\\/?#:\t") == std::string::npos) {
+      std::string expected = path;
+      for (char& c : expected) {
+        if (c == '?' || c == '#') break;
+        if (c == '\\') c = '/';
+      }
+      ASSERT_EQ(parts.path, expected) << scheme + host + path;
+    }
+  }
+  EXPECT_GT(refused, 200);
+  EXPECT_GT(taken, 200);
+}
+
+}  // namespace
+
+namespace {
+
+// Everything of a URL record but its working strings.
+std::string Describe(const html_features::UrlRecord& r) {
+  std::string out = std::to_string(static_cast<int>(r.parts.linkClass)) + r.parts.host + "|" +
+                    r.parts.unicodeHost + "|" + r.parts.path + "|";
+  for (const bool b : {r.parts.relative, r.parts.hasHost, r.trusted, r.white, r.ip, r.hostLexemes,
+                       r.hostKeysKnown})
+    out += b ? '1' : '0';
+  out += "|" + std::to_string(r.key) + "|" + std::to_string(r.category) + "|";
+  for (std::size_t i = 0; i < r.hostKeyCount; ++i) out += std::to_string(r.hostKeys[i]) + ",";
+  for (const float f : r.hostFloats) out += std::to_string(f) + ",";
+  return out;
+}
+
+// The host memo against analysing every URL afresh: random links to listed, unlisted,
+// special and lexeme-bearing hosts (in both cases, as IDN and punycode), with paths under
+// and beside share links, give the same records, and the memo stops growing at its limit.
+TEST(HostMemo, RecordsAgreeWithAnalysingEveryUrlAfresh) {
+  auto lexemes = features_test::Lexemes(features_test::kDefaultLexemes);
+  auto world = features_test::DefaultWorld();
+  world.shareLinks = {
+      {"paypal.com", "/shared/"}, {"www.examplebank.com", "/"}, {"docs.popular.com", "/d"}};
+  static const std::vector<std::string> kHosts = {"paypal.com",
+                                                  "WWW.PayPal.com",
+                                                  "www.examplebank.com",
+                                                  "login.examplemail.com",
+                                                  "paypal.xyz",
+                                                  "docs.popular.com",
+                                                  "secure-login.example",
+                                                  "10.0.0.1",
+                                                  "192.168.1.1",
+                                                  "8.8.8.8",
+                                                  "[::1]",
+                                                  "verify.account.example",
+                                                  "b\xc3\xbc"
+                                                  "cher.example",
+                                                  "xn--bcher-kva.example",
+                                                  "bu\xcc\x88"
+                                                  "cher.example",
+                                                  "unknown.example"};
+  static const std::vector<std::string> kPaths = {"",   "/",    "/shared/",   "/shared/doc",
+                                                  "/d", "/d/e", "/login?x=1", "/a#f"};
+  std::mt19937 rng(31);
+  html_features::HostMemo memo;
+  html_features::UrlRecord withMemo, fresh;
+  int hits = 0;
+  for (int i = 0; i < 3000; ++i) {
+    const std::string url = std::string(rng() % 4 ? "https://" : "//") +
+                            kHosts[rng() % kHosts.size()] + kPaths[rng() % kPaths.size()];
+    const std::size_t before = memo.size();
+    html_features::AnalyseUrl(url, world, lexemes, false, withMemo, &memo);
+    hits += memo.size() == before;
+    html_features::AnalyseUrl(url, world, lexemes, false, fresh);
+    ASSERT_EQ(Describe(withMemo), Describe(fresh)) << url;
+  }
+  EXPECT_GT(hits, 2500);
+  // Past the limit new hosts are still analysed right, and not kept.
+  for (std::size_t i = 0; i < html_features::kMaxRememberedHosts + 50; ++i) {
+    const std::string url = "https://h" + std::to_string(i) + ".paypal.com/x";
+    html_features::AnalyseUrl(url, world, lexemes, false, withMemo, &memo);
+    html_features::AnalyseUrl(url, world, lexemes, false, fresh);
+    ASSERT_EQ(Describe(withMemo), Describe(fresh)) << url;
+  }
+  EXPECT_EQ(memo.size(), html_features::kMaxRememberedHosts);
 }
 
 }  // namespace
