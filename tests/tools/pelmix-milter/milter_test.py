@@ -216,10 +216,18 @@ class MilterTest(unittest.TestCase):
                 self.assertGreaterEqual(sent[0], 10)
                 self.assertIsNone(milter.proc.poll(), "SIGHUP stopped the milter")
                 # Signals sent faster than reloads end are merged: wait for the last reload.
+                # Which files those reloads found depends on timing, so the broken one is
+                # swapped in once more on its own.
                 quiet(milter)
+                failure = "reload failed, still serving the previous knowledge base"
+                failed = milter.text().count(failure)
+                shutil.copyfile(broken, kb + ".new")
+                os.replace(kb + ".new", kb)
+                milter.proc.send_signal(signal.SIGHUP)
+                wait_for(lambda: milter.text().count(failure) > failed, milter.text)
+                self.assertRuns(milter, "one.lua", MILTER_FILE=PHISHING, MILTER_REPLY="accept",
+                                MILTER_WANT=cases[1][1])
                 log = milter.text()
-                self.assertIn("reload failed, still serving the previous knowledge base", log)
-                self.assertIn("reloaded " + kb, log)
 
                 # A different knowledge base that loads is swapped in: the example one judges
                 # the example phishing mail otherwise.
