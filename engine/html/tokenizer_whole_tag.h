@@ -139,6 +139,13 @@ void FastParserMachine<Char, Handler, Config>::wholeAttributes(const Byte* p, co
   std::size_t valueLength = 0;
   Byte valueLast = 0;
 
+  // A streamed run [p, stop) in one call; answers the byte before stop, for the loop to step
+  // onto stop.
+  auto streamRun = [&h](const Byte* from, const Byte* stop) {
+    Config::attributeChars(h, reinterpret_cast<const Char*>(from),
+                           static_cast<std::size_t>(stop - from));
+    return stop - 1;
+  };
   auto reportName = [&] {
     mode = Config::attributeName(h, StringView(name, nameLength));
     nameLength = 0;
@@ -276,10 +283,7 @@ void FastParserMachine<Char, Handler, Config>::wholeAttributes(const Byte* p, co
             --top;
             again = true;
           } else {
-            const Byte* stop = kStreamedEnd.find(p, close);
-            Config::attributeChars(h, reinterpret_cast<const Char*>(p),
-                                   static_cast<std::size_t>(stop - p));
-            p = stop - 1;
+            p = streamRun(p, kStreamedEnd.find(p, close));
           }
           break;
         case kStreamSlash:
@@ -295,10 +299,7 @@ void FastParserMachine<Char, Handler, Config>::wholeAttributes(const Byte* p, co
           if (b == quote) {
             top -= 3;
           } else if (b != '\n') {
-            const Byte* stop = findEither(p, close, quote, '\n');
-            Config::attributeChars(h, reinterpret_cast<const Char*>(p),
-                                   static_cast<std::size_t>(stop - p));
-            p = stop - 1;
+            p = streamRun(p, findEither(p, close, quote, '\n'));
           }
           break;
         case kSkipValue:
