@@ -83,6 +83,39 @@ std::string HostileText(std::mt19937& rng, std::size_t pieces) {
   return text;
 }
 
+// Where a text is cut into chunks (each 1 to maxCut bytes) and after which chunks a word is
+// broken off (one in breakOneIn).
+struct CutPlan {
+  std::vector<std::size_t> cuts;
+  std::vector<bool> breaks;
+};
+
+CutPlan RandomCuts(std::mt19937& rng, std::size_t size, std::size_t maxCut, unsigned breakOneIn) {
+  CutPlan plan;
+  for (std::size_t i = 0; i < size;) {
+    const std::size_t n = std::min<std::size_t>(1 + rng() % maxCut, size - i);
+    plan.cuts.push_back(n);
+    plan.breaks.push_back(rng() % breakOneIn == 0);
+    i += n;
+  }
+  return plan;
+}
+
+// Feeds `text` to the normaliser as the plan cuts it, through its per-byte reader or not.
+template <typename Normalizer>
+void FeedCut(Normalizer& n, const std::string& text, const CutPlan& plan, bool perByte) {
+  std::size_t at = 0;
+  for (std::size_t k = 0; k < plan.cuts.size(); ++k) {
+    if (perByte) {
+      n.textByteByByte(text.data() + at, plan.cuts[k]);
+    } else {
+      n.text(text.data() + at, plan.cuts[k]);
+    }
+    if (plan.breaks[k]) n.wordEnd();
+    at += plan.cuts[k];
+  }
+}
+
 TEST(NormalizerFastPath, AgreesWithThePerByteReaderInAnyChunking) {
   std::mt19937 rng(20261207);
   for (int round = 0; round < 400; ++round) {
@@ -115,27 +148,11 @@ TEST(NormalizerFastPath, BreaksBetweenChunksLandWhereThePerByteReaderPutsThem) {
   std::mt19937 rng(7);
   for (int round = 0; round < 300; ++round) {
     const std::string text = HostileText(rng, 1 + rng() % 120);
-    std::vector<std::size_t> cuts;
-    std::vector<bool> breaks;
-    for (std::size_t i = 0; i < text.size();) {
-      const std::size_t n = std::min<std::size_t>(1 + rng() % 13, text.size() - i);
-      cuts.push_back(n);
-      breaks.push_back(rng() % 5 == 0);
-      i += n;
-    }
+    const CutPlan plan = RandomCuts(rng, text.size(), 13, 5);
     const auto run = [&](bool perByte) {
       Recorder out;
       lex::UTF8Normalizer<Recorder> n(out);
-      std::size_t at = 0;
-      for (std::size_t k = 0; k < cuts.size(); ++k) {
-        if (perByte) {
-          n.textByteByByte(text.data() + at, cuts[k]);
-        } else {
-          n.text(text.data() + at, cuts[k]);
-        }
-        if (breaks[k]) n.wordEnd();
-        at += cuts[k];
-      }
+      FeedCut(n, text, plan, perByte);
       n.wordEnd();
       return out.out;
     };
@@ -204,14 +221,7 @@ TEST(NormalizerFastPath, FinderRunsAgreeWithFeedingByteByByte) {
         text += HostileText(rng, 1);
       }
     }
-    std::vector<std::size_t> cuts;
-    std::vector<bool> breaks;
-    for (std::size_t i = 0; i < text.size();) {
-      const std::size_t n = std::min<std::size_t>(1 + rng() % 23, text.size() - i);
-      cuts.push_back(n);
-      breaks.push_back(rng() % 6 == 0);
-      i += n;
-    }
+    const CutPlan plan = RandomCuts(rng, text.size(), 23, 6);
     const auto run = [&](int how) {
       FinderLog log;
       lex::WordsFinder<LexemeDB, FinderLog> finder(db, log);
@@ -219,16 +229,7 @@ TEST(NormalizerFastPath, FinderRunsAgreeWithFeedingByteByByte) {
       if (how == 2) {
         n.text(text.data(), text.size());
       } else {
-        std::size_t at = 0;
-        for (std::size_t k = 0; k < cuts.size(); ++k) {
-          if (how == 0) {
-            n.textByteByByte(text.data() + at, cuts[k]);
-          } else {
-            n.text(text.data() + at, cuts[k]);
-          }
-          if (breaks[k]) n.wordEnd();
-          at += cuts[k];
-        }
+        FeedCut(n, text, plan, how == 0);
       }
       n.wordEnd();
       return log.out;
